@@ -1,0 +1,158 @@
+/*
+ * OrvaneSDK: analytics event log and launch identity for games.
+ *
+ * The library records a game's analytics events as encrypted lines in one
+ * local log file per game id, hands the game the user UUID and game id that
+ * the launcher put on the process command line, and tells the game what it
+ * did through one log callback.
+ *
+ * Where the files go:
+ *   Windows: C:\Orvane\Logs\<game id>.log
+ *   Linux:   $XDG_DATA_HOME/Orvane/Logs/<game id>.log
+ *            (or ~/.local/share/Orvane/Logs/<game id>.log)
+ *
+ * Threads: every function may be called from any thread, also at the same
+ * time. The library starts no thread of its own; every function runs to
+ * completion on the caller's thread and delivers its messages to the
+ * registered callback on that thread before it returns. No library lock is
+ * held while the callback runs, so a callback may call back into the library.
+ *
+ * Texts: every text is zero-terminated narrow (8-bit) text, used byte for
+ * byte. The library only reads a text argument during the call and keeps no
+ * pointer to it. A null text counts as an empty one.
+ *
+ * Errors: no function throws, aborts or returns an error code other than the
+ * ones documented here. Failures show as a result and an ORVANE_LOG_ERROR
+ * message.
+ */
+#ifndef ORVANE_SDK_H
+#define ORVANE_SDK_H
+
+#include <stdint.h>
+
+#if defined(_WIN32)
+#  define ORVANE_CALL __cdecl
+#  if defined(ORVANE_BUILDING_LIBRARY)
+#    define ORVANE_API __declspec(dllexport)
+#  elif defined(ORVANE_STATIC)
+#    define ORVANE_API
+#  else
+#    define ORVANE_API __declspec(dllimport)
+#  endif
+#else
+#  define ORVANE_CALL
+#  define ORVANE_API __attribute__((visibility("default")))
+#endif
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/*
+ * Level of a message: how the host should take it. Only these three occur.
+ * C sees a 32-bit integer and prefixed constants; C++ sees a scoped enum of
+ * the same size, so no bare name such as `Error` enters the host's scope.
+ */
+#define ORVANE_LOG_INFO 0    /* success and progress */
+#define ORVANE_LOG_WARNING 1 /* notice about the state of a game's log file */
+#define ORVANE_LOG_ERROR 2   /* refused input or a failure */
+
+#ifdef __cplusplus
+enum class LogLevel : int32_t { Info = 0, Warning = 1, Error = 2 };
+#else
+typedef int32_t LogLevel;
+#endif
+
+/*
+ * The host's log callback, called on the thread of the library call that
+ * caused the message. `message` begins with "[OrvaneSDK] ", carries no line
+ * end, and is valid only during the call: copy it to keep it.
+ * C# declares it as [UnmanagedFunctionPointer(CallingConvention.Cdecl)]
+ * delegate void LogCallback(int level, string message); keep the delegate
+ * alive for as long as it is registered.
+ */
+typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
+
+/*
+ * Registers the one log callback, replacing the previous one (null included).
+ * A non-null callback at once receives
+ *   (ORVANE_LOG_INFO, "[OrvaneSDK] Logging initiated.").
+ * A null callback unregisters: messages are then dropped until a non-null
+ * callback is registered. Messages sent while none is registered are lost;
+ * register first to see everything.
+ */
+ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback);
+
+/*
+ * Creates the storage directories (Windows: C:\Orvane\ and C:\Orvane\Logs\)
+ * where they are missing, then reports
+ *   (ORVANE_LOG_INFO,  "[OrvaneSDK] Initialize() - OK.")      or
+ *   (ORVANE_LOG_ERROR, "[OrvaneSDK] Initialize() - failed.")  when the logs
+ *   directory still does not exist afterwards.
+ * Optional: recording an event initialises the SDK itself when needed.
+ */
+ORVANE_API void ORVANE_CALL oInitialize(void);
+
+/*
+ * Analytics events. Each appends one encrypted line to the game's log file,
+ * which always starts with the game's INIT line, and returns 0 on success or
+ * -1 when the call was refused or the line could not be written.
+ *
+ * Messages, each "[OrvaneSDK] Analytics <TYPE> - " followed by:
+ *   INFO    "OK"                                   line written, result 0
+ *   INFO    "SDK was never initialized. Initializing the SDK."
+ *                                                  (then oInitialize runs)
+ *   WARNING "log was never initialized. Initialized the game log"
+ *                                                  (ENTER/EXIT/SPECIAL on an
+ *                                                  empty log: an INIT line is
+ *                                                  written first, with its
+ *                                                  own INIT messages)
+ *   WARNING "log had been already initialized."   INIT on a non-empty log:
+ *                                                  nothing written, result 0
+ *   ERROR   "failed. Game id is empty"             result -1
+ *   ERROR   "failed. User id is empty"             result -1
+ *   ERROR   "log file failed to open. Maybe a bad game_id (<id>)?"
+ *                                                  result -1; also for a game
+ *                                                  id that is not a plain file
+ *                                                  name (see below)
+ *   ERROR   "log file failed to write."            result -1 (disk full, I/O)
+ *   ERROR   "failed. Record encryption failed."    result -1
+ *
+ * A game id must be usable as a file name on every platform: it is refused
+ * when it is "." or "..", holds a byte below 0x20 or one of / \ : * ? " < > |,
+ * ends in "." or " ", or its part before the first "." is a Windows device
+ * name (CON, PRN, AUX, NUL, COM0-COM9, LPT0-LPT9, any case).
+ */
+ORVANE_API int32_t ORVANE_CALL oAnalyticsInit(const char *gameId, const char *userId);
+ORVANE_API int32_t ORVANE_CALL oAnalyticsGameEnter(const char *gameId, const char *userId);
+ORVANE_API int32_t ORVANE_CALL oAnalyticsGameExit(const char *gameId, const char *userId);
+/* `extra` is the game's own text for the event, stored with it (null = ""). */
+ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char *userId,
+                                                 const char *extra);
+
+/*
+ * Launch identity: the text that follows "--userUuid--" (oAuthGetUserUuid) or
+ * "--gameId--" (oAuthGetGameId) in the first process argument that holds the
+ * marker, up to the end of that argument.
+ *
+ * The result is never null.
+ *   - Found: a new block from the C runtime's malloc, owned by the caller, who
+ *     releases it with free() of the same C runtime. Every call returns a new
+ *     block. Messages: (INFO, "[OrvaneSDK] Authentication - OK") or
+ *     (INFO, "[OrvaneSDK] Return GameID - OK").
+ *   - Not found or empty: a constant empty text "" that must NOT be freed.
+ *     Messages: (ERROR, "[OrvaneSDK] Authentication - Failed") or
+ *     (ERROR, "[OrvaneSDK] Return GameID - Empty").
+ * The rule for hosts: free a non-empty result, never an empty one.
+ *
+ * Each UTF-16 unit of the Windows command line gives one byte, its low 8 bits
+ * (on Linux each argument's bytes come back unchanged).
+ */
+ORVANE_API char *ORVANE_CALL oAuthGetUserUuid(void);
+ORVANE_API char *ORVANE_CALL oAuthGetGameId(void);
+
+#ifdef __cplusplus
+} /* extern "C" */
+#endif
+
+#endif /* ORVANE_SDK_H */

@@ -1,0 +1,23 @@
+// The record text of one event: a JSON object with five string members,
+// "user_id", "game_id", "type", "time" and "extra", in that order, with no
+// white space and no line end.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+namespace orvane {
+
+// Appends `value` as the inside of a JSON string: `"` and `\` are escaped and
+// bytes below 0x20 take their JSON escape; every other byte stands as it came.
+void AppendJsonEscaped(std::string &out, std::string_view value);
+
+// Appends the record text of one event stamped with `time`.
+void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,
+                       std::string_view type, std::string_view time, std::string_view extra);
+
+// The record text of one event, stamped with the current UTC time.
+std::string ComposeEventRecord(std::string_view game_id, std::string_view user_id,
+                               std::string_view type, std::string_view extra);
+
+} // namespace orvane

@@ -1,0 +1,77 @@
+#include "analytics/timestamp.h"
+
+#include "platform/platform.h"
+
+namespace orvane {
+namespace {
+
+struct CalendarTime {
+  std::int64_t year, month, day, hour, minute, second; // month 1 to 12
+};
+
+std::int64_t FloorDiv(std::int64_t a, std::int64_t b) { return a / b - ((a % b != 0) && ((a < 0) != (b < 0))); }
+
+// Proleptic Gregorian calendar from a day count, valid for every int64 input
+// that matters; unlike gmtime it cannot fail, so the text is always a date.
+CalendarTime UtcCalendar(std::int64_t seconds) {
+  const std::int64_t days = FloorDiv(seconds, 86400);
+  const std::int64_t in_day = seconds - days * 86400;
+  const std::int64_t z = days + 719468; // days since 0000-03-01
+  const std::int64_t era = FloorDiv(z, 146097);
+  const std::int64_t doe = z - era * 146097;
+  const std::int64_t yoe = (doe - doe / 1460 + doe / 36524 - doe / 146096) / 365;
+  const std::int64_t doy = doe - (365 * yoe + yoe / 4 - yoe / 100);
+  const std::int64_t mp = (5 * doy + 2) / 153;
+  CalendarTime t;
+  t.day = doy - (153 * mp + 2) / 5 + 1;
+  t.month = mp < 10 ? mp + 3 : mp - 9;
+  t.year = yoe + era * 400 + (t.month <= 2);
+  t.hour = in_day / 3600;
+  t.minute = in_day % 3600 / 60;
+  t.second = in_day % 60;
+  return t;
+}
+
+} // namespace
+
+std::string PadNumber(std::int64_t value, int width) {
+  std::string digits = std::to_string(value);
+  if (static_cast<int>(digits.size()) < width) digits.insert(0, width - digits.size(), '0');
+  return digits;
+}
+
+std::string FormatTimestampAt(std::int64_t seconds) {
+  // Keeps the year within what the calendar arithmetic handles without
+  // overflow; real clocks are nowhere near either end.
+  constexpr std::int64_t kLimit = INT64_C(1) << 50;
+  if (seconds > kLimit) seconds = kLimit;
+  if (seconds < -kLimit) seconds = -kLimit;
+  const CalendarTime t = UtcCalendar(seconds);
+  std::string text;
+  text.reserve(19);
+  text += PadNumber(t.year, 4);
+  text += '-';
+  text += PadNumber(t.month, 2);
+  text += '-';
+  text += PadNumber(t.day, 2);
+  text += 'T';
+  text += PadNumber(t.hour, 2);
+  text += ':';
+  text += PadNumber(t.minute, 2);
+  text += ':';
+  text += PadNumber(t.second, 2);
+  return text;
+}
+
+std::string FormatTimestamp() { return FormatTimestampAt(platform::calls().now_seconds()); }
+
+std::string_view TimestampCache::Now() {
+  const std::int64_t now = platform::calls().now_seconds();
+  if (now != seconds) {
+    text = FormatTimestampAt(now);
+    seconds = now;
+  }
+  return text;
+}
+
+} // namespace orvane

@@ -1,0 +1,70 @@
+// The operating-system calls the library needs, behind one table.
+//
+// Each platform (posix/, windows/) fills the table with its own
+// implementation; the logic above calls only through it and never asks which
+// platform it runs on. Tests replace single entries to inject failures, the
+// way SQLite swaps its system calls.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace orvane::platform {
+
+// An open log file; kNoFile when an open failed.
+using FileHandle = std::intptr_t;
+inline constexpr FileHandle kNoFile = -1;
+
+// The process arguments in command-line order, argument 0 included, each as
+// 16-bit units.
+using ArgumentList = std::vector<std::u16string>;
+
+struct Calls {
+  // True exactly when `path` names an existing directory, with or without a
+  // trailing separator.
+  bool (*directory_exists)(const char *path);
+  // Creates one directory level with default permissions.
+  bool (*make_directory)(const char *path);
+  // Creates `path` and its missing parents, readable by the owner only.
+  bool (*make_private_directories)(const char *path);
+
+  // Opens `path` for appending, creating it when missing, with no sharing
+  // restriction toward other handles or processes.
+  FileHandle (*open_append)(const char *path);
+  // Size of the open file in bytes, -1 when it cannot be taken.
+  std::int64_t (*file_size)(FileHandle file);
+  // One write at the current end of the file; true only when all bytes went.
+  bool (*append)(FileHandle file, const void *data, std::size_t size);
+  // True when everything buffered reached the file.
+  bool (*close_file)(FileHandle file);
+  // Advisory lock between processes, waiting a bounded time. False means the
+  // lock could not be had and the caller goes on without it.
+  bool (*lock_file)(FileHandle file);
+  void (*unlock_file)(FileHandle file);
+
+  // Whole seconds since 1970-01-01 00:00:00 UTC.
+  std::int64_t (*now_seconds)();
+  // The process argument list, read afresh. False when it cannot be had.
+  bool (*argument_list)(ArgumentList &args);
+};
+
+// The live table. Tests may overwrite entries and restore them afterwards.
+Calls &calls();
+// The platform's own implementation, for restoring.
+const Calls &native_calls();
+
+// Where the library keeps its files on this platform.
+struct StorageLocation {
+  std::string base; // created with its parents when missing; empty: taken to exist
+  std::string root; // ends in the separator
+  std::string logs; // directly inside root, ends in the separator
+};
+StorageLocation default_storage_location();
+
+// The bytes that separate two lines of a log file.
+std::string_view line_break();
+
+} // namespace orvane::platform

@@ -1,0 +1,160 @@
+// POSIX implementation of the platform table.
+#include "platform/platform.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <ctime>
+#include <fcntl.h>
+#include <pwd.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace orvane::platform {
+namespace {
+
+bool DirectoryExistsPosix(const char *path) {
+  struct stat st;
+  return ::stat(path, &st) == 0 && S_ISDIR(st.st_mode);
+}
+
+bool MakeDirectoryPosix(const char *path) { return ::mkdir(path, 0777) == 0; }
+
+bool MakePrivateDirectoriesPosix(const char *path) {
+  std::string partial(path);
+  // Create each missing level from the top, so that a missing parent of the
+  // data directory gets the same owner-only mode.
+  for (std::size_t i = 1; i <= partial.size(); ++i) {
+    if (i != partial.size() && partial[i] != '/') continue;
+    std::string level = partial.substr(0, i);
+    if (::mkdir(level.c_str(), 0700) != 0 && errno != EEXIST) return false;
+  }
+  return DirectoryExistsPosix(path);
+}
+
+FileHandle OpenAppendPosix(const char *path) {
+  int fd;
+  do {
+    fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0666);
+  } while (fd < 0 && errno == EINTR);
+  return fd < 0 ? kNoFile : fd;
+}
+
+std::int64_t FileSizePosix(FileHandle file) {
+  struct stat st;
+  if (::fstat(static_cast<int>(file), &st) != 0) return -1;
+  return st.st_size;
+}
+
+bool AppendPosix(FileHandle file, const void *data, std::size_t size) {
+  // One write call: with O_APPEND the kernel places the whole line at the end
+  // atomically, so lines of concurrent writers never interleave. A short
+  // write (disk full) is a failure; retrying would split the line.
+  ssize_t written;
+  do {
+    written = ::write(static_cast<int>(file), data, size);
+  } while (written < 0 && errno == EINTR);
+  return written >= 0 && static_cast<std::size_t>(written) == size;
+}
+
+bool CloseFilePosix(FileHandle file) {
+  // On Linux the descriptor is released even when close reports EINTR, so it
+  // is never retried.
+  return ::close(static_cast<int>(file)) == 0;
+}
+
+bool LockFilePosix(FileHandle file) {
+  // flock, not fcntl: fcntl locks vanish when any descriptor of the file is
+  // closed in this process, which the nested INIT run does.
+  constexpr int kAttempts = 200; // 200 x 5 ms: one second at the most
+  for (int i = 0; i < kAttempts; ++i) {
+    if (::flock(static_cast<int>(file), LOCK_EX | LOCK_NB) == 0) return true;
+    if (errno != EWOULDBLOCK && errno != EINTR) return false;
+    struct timespec pause = {0, 5 * 1000 * 1000};
+    ::nanosleep(&pause, nullptr);
+  }
+  return false;
+}
+
+void UnlockFilePosix(FileHandle file) { ::flock(static_cast<int>(file), LOCK_UN); }
+
+std::int64_t NowSecondsPosix() { return static_cast<std::int64_t>(::time(nullptr)); }
+
+bool ArgumentListPosix(ArgumentList &args) {
+  args.clear();
+  int fd = ::open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return false;
+  std::string bytes;
+  char chunk[4096];
+  for (;;) {
+    ssize_t n = ::read(fd, chunk, sizeof chunk);
+    if (n < 0 && errno == EINTR) continue;
+    if (n < 0) {
+      ::close(fd);
+      return false;
+    }
+    if (n == 0) break;
+    bytes.append(chunk, static_cast<std::size_t>(n));
+  }
+  ::close(fd);
+  // Every argument ends in a zero byte; each byte becomes one unit so that
+  // narrowing gives the argument's bytes back unchanged.
+  std::u16string current;
+  for (char c : bytes) {
+    if (c == '\0') {
+      args.push_back(std::move(current));
+      current.clear();
+    } else {
+      current.push_back(static_cast<char16_t>(static_cast<unsigned char>(c)));
+    }
+  }
+  if (!current.empty()) args.push_back(std::move(current));
+  return true;
+}
+
+std::string HomeDirectory() {
+  if (const char *home = std::getenv("HOME"); home && home[0] == '/') return home;
+  long size = ::sysconf(_SC_GETPW_R_SIZE_MAX);
+  std::vector<char> buffer(size > 0 ? static_cast<std::size_t>(size) : 16384);
+  struct passwd entry;
+  struct passwd *found = nullptr;
+  if (::getpwuid_r(::getuid(), &entry, buffer.data(), buffer.size(), &found) == 0 && found &&
+      found->pw_dir && found->pw_dir[0] == '/')
+    return found->pw_dir;
+  return {};
+}
+
+const Calls kPosixCalls = {
+    DirectoryExistsPosix, MakeDirectoryPosix, MakePrivateDirectoriesPosix,
+    OpenAppendPosix,      FileSizePosix,      AppendPosix,
+    CloseFilePosix,       LockFilePosix,      UnlockFilePosix,
+    NowSecondsPosix,      ArgumentListPosix,
+};
+
+Calls g_calls = kPosixCalls;
+
+} // namespace
+
+Calls &calls() { return g_calls; }
+const Calls &native_calls() { return kPosixCalls; }
+
+StorageLocation default_storage_location() {
+  // A per-user location: it needs no root rights, and no other user can
+  // prepare it the way a shared /tmp or /var path can be.
+  StorageLocation where;
+  if (const char *xdg = std::getenv("XDG_DATA_HOME"); xdg && xdg[0] == '/') {
+    where.base = xdg;
+  } else {
+    std::string home = HomeDirectory();
+    if (home.empty()) return where; // nowhere to store: every open fails
+    where.base = home + "/.local/share";
+  }
+  while (where.base.size() > 1 && where.base.back() == '/') where.base.pop_back();
+  where.root = where.base + "/Orvane/";
+  where.logs = where.root + "Logs/";
+  return where;
+}
+
+std::string_view line_break() { return "\n"; }
+
+} // namespace orvane::platform

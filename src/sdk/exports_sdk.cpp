@@ -1,0 +1,19 @@
+// Exports of the SDK surface: the log channel and initialisation.
+#include "OrvaneSDK.h"
+#include "sdk/export_guard.h"
+#include "sdk/storage.h"
+
+extern "C" {
+
+ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback) {
+  orvane::RegisterForLogs(callback);
+}
+
+ORVANE_API void ORVANE_CALL oInitialize(void) {
+  orvane::RunExport(0, "[OrvaneSDK] Initialize() - failed.", [](orvane::MessageBatch &messages) {
+    orvane::InitializeStorage(messages);
+    return 0;
+  });
+}
+
+} // extern "C"

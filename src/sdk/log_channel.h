@@ -1,0 +1,41 @@
+// The host log channel: the one registered callback and the messages that a
+// call of the library sends to it.
+#pragma once
+
+#include "OrvaneSDK.h"
+
+#include <array>
+#include <cstddef>
+#include <string>
+
+namespace orvane {
+
+// Delivers (level, message) to the registered callback, or drops it when
+// none is registered.
+void LogToHost(LogLevel level, const char *message) noexcept;
+
+// Replaces the registered callback; a non-null one is greeted at once.
+void RegisterForLogs(LogCallback callback) noexcept;
+
+// The messages of one exported call, in the order they arose. They go to the
+// host only when the call has finished its work and released every lock, so
+// a callback that blocks or calls back into the library cannot deadlock it.
+struct MessageBatch {
+  struct Entry {
+    LogLevel level;
+    const char *text;  // a constant text, or owned.c_str()
+    std::string owned; // for texts assembled at run time
+  };
+  // More than one call ever sends: a first event on a new machine sends five.
+  static constexpr std::size_t kCapacity = 8;
+  std::array<Entry, kCapacity> entries{};
+  std::size_t count = 0;
+
+  // `text` must outlive the batch (a literal).
+  void Add(LogLevel level, const char *text) noexcept;
+  void AddOwned(LogLevel level, std::string text);
+  // Sends every message through LogToHost, in order, and empties the batch.
+  void Deliver() noexcept;
+};
+
+} // namespace orvane

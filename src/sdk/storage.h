@@ -1,0 +1,23 @@
+// The storage directories: where they are, whether they exist, and creating
+// them.
+#pragma once
+
+#include "platform/platform.h"
+#include "sdk/log_channel.h"
+
+namespace orvane {
+
+// The directories of this process, fixed when the library is loaded.
+const platform::StorageLocation &Storage();
+// Points the library at other directories; tests use it to stay out of the
+// real home directory.
+void SetStorageForTesting(platform::StorageLocation where);
+
+bool DirectoryExists(const char *path);
+
+// Creates the root and logs directories where they are missing and adds
+// "Initialize() - OK." or, when the logs directory is still missing,
+// "Initialize() - failed." to `messages`.
+void InitializeStorage(MessageBatch &messages);
+
+} // namespace orvane
