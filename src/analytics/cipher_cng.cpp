@@ -1,0 +1,110 @@
+// Record cipher on Windows CNG (bcrypt.dll): part of every Windows system,
+// so a game ships nothing beside the DLL for it.
+#include "analytics/cipher.h"
+
+#define WIN32_LEAN_AND_MEAN
+#ifndef NOMINMAX // libstdc++ on mingw defines it already
+#define NOMINMAX
+#endif
+#include <windows.h>
+
+#include <bcrypt.h>
+
+#include <climits>
+#include <cstdio>
+#include <cstring>
+
+namespace orvane::cipher {
+
+struct Session {
+  BCRYPT_ALG_HANDLE algorithm = nullptr;
+  BCRYPT_KEY_HANDLE key = nullptr;
+  std::uint8_t iv[kIvSize];
+};
+
+namespace {
+
+bool Succeeded(NTSTATUS status, const char *call) {
+  if (BCRYPT_SUCCESS(status)) return true;
+  if (call != nullptr)
+    std::fprintf(stderr, "OrvaneSDK: %s failed with NTSTATUS 0x%08lx\n", call,
+                 static_cast<unsigned long>(status));
+  return false;
+}
+
+void CloseCng(Session *session) {
+  if (session == nullptr) return;
+  if (session->key != nullptr) ::BCryptDestroyKey(session->key);
+  if (session->algorithm != nullptr) ::BCryptCloseAlgorithmProvider(session->algorithm, 0);
+  delete session;
+}
+
+// The key schedule is made once per session; every record starts again from
+// the session's IV.
+Session *OpenCng(const std::uint8_t *key, const std::uint8_t *iv) {
+  auto *session = new Session;
+  std::memcpy(session->iv, iv, kIvSize);
+  static const wchar_t kCbc[] = BCRYPT_CHAIN_MODE_CBC;
+  const bool ok =
+      Succeeded(::BCryptOpenAlgorithmProvider(&session->algorithm, BCRYPT_AES_ALGORITHM, nullptr, 0),
+                "BCryptOpenAlgorithmProvider") &&
+      Succeeded(::BCryptSetProperty(session->algorithm, BCRYPT_CHAINING_MODE,
+                                    reinterpret_cast<PUCHAR>(const_cast<wchar_t *>(kCbc)),
+                                    sizeof kCbc, 0),
+                "BCryptSetProperty(ChainingModeCBC)") &&
+      Succeeded(::BCryptGenerateSymmetricKey(session->algorithm, &session->key, nullptr, 0,
+                                             const_cast<PUCHAR>(key), kKeySize, 0),
+                "BCryptGenerateSymmetricKey");
+  if (!ok) {
+    CloseCng(session);
+    return nullptr;
+  }
+  return session;
+}
+
+std::ptrdiff_t EncryptCng(Session *session, const std::uint8_t *in, std::size_t size,
+                          std::uint8_t *out) {
+  if (size > static_cast<std::size_t>(LONG_MAX) - 2 * kBlockSize) {
+    std::fprintf(stderr, "OrvaneSDK: BCryptEncrypt refused: record of %zu bytes\n", size);
+    return -1;
+  }
+  // CNG leaves the last ciphertext block in the IV buffer; a copy keeps every
+  // record starting from the same IV.
+  std::uint8_t iv[kIvSize];
+  std::memcpy(iv, session->iv, kIvSize);
+  static std::uint8_t nothing = 0; // an empty record still has a valid address
+  const ULONG room = static_cast<ULONG>(CiphertextSize(size));
+  ULONG written = 0;
+  if (!Succeeded(::BCryptEncrypt(session->key, const_cast<PUCHAR>(size ? in : &nothing),
+                                 static_cast<ULONG>(size), nullptr, iv, kIvSize, out, room,
+                                 &written, BCRYPT_BLOCK_PADDING),
+                 "BCryptEncrypt"))
+    return -1;
+  return static_cast<std::ptrdiff_t>(written);
+}
+
+std::ptrdiff_t DecryptCng(Session *session, const std::uint8_t *in, std::size_t size,
+                          std::uint8_t *out) {
+  if (size == 0 || size % kBlockSize != 0 || size > static_cast<std::size_t>(LONG_MAX / 2))
+    return -1;
+  std::uint8_t iv[kIvSize];
+  std::memcpy(iv, session->iv, kIvSize);
+  ULONG written = 0;
+  // A damaged line (bad padding) is the reader's business: nothing printed.
+  if (!Succeeded(::BCryptDecrypt(session->key, const_cast<PUCHAR>(in), static_cast<ULONG>(size),
+                                 nullptr, iv, kIvSize, out, static_cast<ULONG>(size + kBlockSize),
+                                 &written, BCRYPT_BLOCK_PADDING),
+                 nullptr))
+    return -1;
+  return static_cast<std::ptrdiff_t>(written);
+}
+
+const Backend kCng = {OpenCng, CloseCng, EncryptCng, DecryptCng};
+Backend g_backend = kCng;
+
+} // namespace
+
+Backend &backend() { return g_backend; }
+const Backend &native_backend() { return kCng; }
+
+} // namespace orvane::cipher
