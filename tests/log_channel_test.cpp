@@ -1,0 +1,99 @@
+// The host log channel: who hears which message, after which registration.
+#include "OrvaneSDK.h"
+#include "sdk/log_channel.h"
+#include "support/test_support.h"
+
+#include <cstdlib>
+#include <string>
+#include <vector>
+
+namespace orvane::testing {
+namespace {
+
+std::vector<std::string> g_heard_a, g_heard_b;
+void ORVANE_CALL HearA(LogLevel, const char *message) { g_heard_a.push_back(message); }
+void ORVANE_CALL HearB(LogLevel, const char *message) { g_heard_b.push_back(message); }
+
+enum class Step { RegisterA, RegisterB, RegisterNull, Report };
+
+struct ChannelCase {
+  const char *name;
+  std::vector<Step> steps;
+  std::vector<std::string> heard_a;
+  std::vector<std::string> heard_b;
+};
+
+constexpr const char *kHello = "[OrvaneSDK] Logging initiated.";
+constexpr const char *kNote = "[OrvaneSDK] note";
+
+TEST(LogChannel, DeliversToTheRegisteredCallbackOnly) {
+  const ChannelCase cases[] = {
+      {"lost before registration, not replayed", {Step::Report, Step::RegisterA}, {kHello}, {}},
+      {"delivered after registration", {Step::RegisterA, Step::Report}, {kHello, kNote}, {}},
+      {"null silences", {Step::RegisterA, Step::RegisterNull, Step::Report}, {kHello}, {}},
+      {"null then a callback restores delivery",
+       {Step::RegisterNull, Step::Report, Step::RegisterA, Step::Report},
+       {kHello, kNote},
+       {}},
+      {"same callback twice is greeted twice", {Step::RegisterA, Step::RegisterA}, {kHello, kHello}, {}},
+      {"B replaces A", {Step::RegisterA, Step::RegisterB, Step::Report}, {kHello}, {kHello, kNote}},
+  };
+  for (const ChannelCase &c : cases) {
+    SCOPED_TRACE(c.name);
+    oRegisterForLogs(nullptr);
+    g_heard_a.clear();
+    g_heard_b.clear();
+    for (Step step : c.steps) {
+      switch (step) {
+      case Step::RegisterA: oRegisterForLogs(HearA); break;
+      case Step::RegisterB: oRegisterForLogs(HearB); break;
+      case Step::RegisterNull: oRegisterForLogs(nullptr); break;
+      case Step::Report: LogToHost(LogLevel::Warning, kNote); break;
+      }
+    }
+    EXPECT_EQ(g_heard_a, c.heard_a);
+    EXPECT_EQ(g_heard_b, c.heard_b);
+  }
+  oRegisterForLogs(nullptr);
+}
+
+// A batch holds its messages back until Deliver and keeps their order and
+// levels, also for texts assembled at run time.
+TEST(LogChannel, BatchDeliversInOrderAfterTheWork) {
+  Captured().clear();
+  oRegisterForLogs(CaptureMessage);
+  Captured().clear();
+  {
+    MessageBatch batch;
+    batch.Add(LogLevel::Info, "[OrvaneSDK] one");
+    batch.AddOwned(LogLevel::Error, std::string("[OrvaneSDK] two ") + "(assembled)");
+    batch.Add(LogLevel::Warning, "[OrvaneSDK] three");
+    EXPECT_TRUE(Captured().empty());
+    batch.Deliver();
+    batch.Deliver(); // nothing is sent twice
+  }
+  const std::vector<Message> expected = {{0, "[OrvaneSDK] one"},
+                                         {2, "[OrvaneSDK] two (assembled)"},
+                                         {1, "[OrvaneSDK] three"}};
+  EXPECT_EQ(Captured(), expected);
+  oRegisterForLogs(nullptr);
+}
+
+// A callback may call back into the library: no lock is held while it runs.
+int g_reentered = 0;
+void ORVANE_CALL Reenter(LogLevel, const char *message) {
+  if (std::string(message) == "[OrvaneSDK] Logging initiated." && g_reentered++ == 0) {
+    char *id = oAuthGetGameId(); // touches nothing on disk
+    if (id[0] != '\0') std::free(id);
+  }
+}
+
+TEST(LogChannel, CallbackMayCallTheLibrary) {
+  g_reentered = 0;
+  oRegisterForLogs(Reenter);
+  oRegisterForLogs(nullptr);
+  EXPECT_EQ(g_reentered, 1);
+}
+
+} // namespace
+} // namespace orvane::testing
