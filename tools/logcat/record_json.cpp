@@ -1,0 +1,159 @@
+#include "record_json.h"
+
+#include "analytics/record_text.h"
+
+#include <array>
+#include <cstdint>
+
+namespace orvane::logcat {
+namespace {
+
+struct Cursor {
+  std::string_view text;
+  std::size_t at = 0;
+
+  bool AtEnd() const { return at >= text.size(); }
+  char Peek() const { return text[at]; }
+  void SkipSpace() {
+    while (!AtEnd() && (Peek() == ' ' || Peek() == '\t' || Peek() == '\n' || Peek() == '\r')) ++at;
+  }
+  bool Take(char c) {
+    if (AtEnd() || Peek() != c) return false;
+    ++at;
+    return true;
+  }
+};
+
+int HexValue(char c) {
+  if (c >= '0' && c <= '9') return c - '0';
+  if (c >= 'a' && c <= 'f') return c - 'a' + 10;
+  if (c >= 'A' && c <= 'F') return c - 'A' + 10;
+  return -1;
+}
+
+std::optional<std::uint32_t> ReadHex4(Cursor &in) {
+  if (in.text.size() - in.at < 4) return std::nullopt;
+  std::uint32_t value = 0;
+  for (int i = 0; i < 4; ++i) {
+    const int digit = HexValue(in.text[in.at + i]);
+    if (digit < 0) return std::nullopt;
+    value = value * 16 + static_cast<std::uint32_t>(digit);
+  }
+  in.at += 4;
+  return value;
+}
+
+void AppendUtf8(std::string &out, std::uint32_t code) {
+  if (code < 0x80) {
+    out += static_cast<char>(code);
+  } else if (code < 0x800) {
+    out += static_cast<char>(0xc0 | (code >> 6));
+    out += static_cast<char>(0x80 | (code & 0x3f));
+  } else if (code < 0x10000) {
+    out += static_cast<char>(0xe0 | (code >> 12));
+    out += static_cast<char>(0x80 | ((code >> 6) & 0x3f));
+    out += static_cast<char>(0x80 | (code & 0x3f));
+  } else {
+    out += static_cast<char>(0xf0 | (code >> 18));
+    out += static_cast<char>(0x80 | ((code >> 12) & 0x3f));
+    out += static_cast<char>(0x80 | ((code >> 6) & 0x3f));
+    out += static_cast<char>(0x80 | (code & 0x3f));
+  }
+}
+
+// The code point of a \u escape whose "\u" has been taken, joining a
+// surrogate pair into one.
+std::optional<std::uint32_t> ReadUnicodeEscape(Cursor &in) {
+  const auto first = ReadHex4(in);
+  if (!first) return std::nullopt;
+  if (*first >= 0xdc00 && *first <= 0xdfff) return std::nullopt;
+  if (*first < 0xd800 || *first > 0xdbff) return first;
+  if (!in.Take('\\') || !in.Take('u')) return std::nullopt;
+  const auto second = ReadHex4(in);
+  if (!second || *second < 0xdc00 || *second > 0xdfff) return std::nullopt;
+  return 0x10000 + ((*first - 0xd800) << 10) + (*second - 0xdc00);
+}
+
+// A JSON string, unescaped. Raw bytes of 0x80 and above pass as they are,
+// valid UTF-8 or not: that is how the library stores a game's bytes.
+std::optional<std::string> ReadString(Cursor &in) {
+  if (!in.Take('"')) return std::nullopt;
+  std::string value;
+  for (;;) {
+    if (in.AtEnd()) return std::nullopt;
+    const char c = in.text[in.at++];
+    if (c == '"') return value;
+    if (static_cast<unsigned char>(c) < 0x20) return std::nullopt;
+    if (c != '\\') {
+      value += c;
+      continue;
+    }
+    if (in.AtEnd()) return std::nullopt;
+    switch (in.text[in.at++]) {
+    case '"': value += '"'; break;
+    case '\\': value += '\\'; break;
+    case '/': value += '/'; break;
+    case 'b': value += '\b'; break;
+    case 'f': value += '\f'; break;
+    case 'n': value += '\n'; break;
+    case 'r': value += '\r'; break;
+    case 't': value += '\t'; break;
+    case 'u': {
+      const auto code = ReadUnicodeEscape(in);
+      if (!code) return std::nullopt;
+      AppendUtf8(value, *code);
+      break;
+    }
+    default:
+      return std::nullopt;
+    }
+  }
+}
+
+std::string *MemberFor(EventRecord &record, std::string_view name) {
+  if (name == "user_id") return &record.user_id;
+  if (name == "game_id") return &record.game_id;
+  if (name == "type") return &record.type;
+  if (name == "time") return &record.time;
+  if (name == "extra") return &record.extra;
+  return nullptr;
+}
+
+} // namespace
+
+std::optional<EventRecord> ParseEventRecord(std::string_view text) {
+  Cursor in{text};
+  EventRecord record;
+  std::array<const std::string *, 5> seen{};
+  std::size_t count = 0;
+  in.SkipSpace();
+  if (!in.Take('{')) return std::nullopt;
+  for (;;) {
+    in.SkipSpace();
+    const auto name = ReadString(in);
+    if (!name) return std::nullopt;
+    std::string *member = MemberFor(record, *name);
+    if (member == nullptr) return std::nullopt;
+    for (std::size_t i = 0; i < count; ++i)
+      if (seen[i] == member) return std::nullopt;
+    seen[count++] = member;
+    in.SkipSpace();
+    if (!in.Take(':')) return std::nullopt;
+    in.SkipSpace();
+    auto value = ReadString(in);
+    if (!value) return std::nullopt;
+    *member = std::move(*value);
+    in.SkipSpace();
+    if (in.Take('}')) break;
+    if (count == seen.size() || !in.Take(',')) return std::nullopt;
+  }
+  in.SkipSpace();
+  if (!in.AtEnd() || count != seen.size()) return std::nullopt;
+  return record;
+}
+
+void AppendRecordJson(std::string &out, const EventRecord &record) {
+  AppendEventRecord(out, record.game_id, record.user_id, record.type, record.time, record.extra);
+}
+
+} // namespace orvane::logcat
