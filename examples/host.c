@@ -15,6 +15,8 @@
  *   special GAME USER EXTRA   oAnalyticsSpecial
  *   uuid                oAuthGetUserUuid
  *   gameid              oAuthGetGameId
+ *   wait-for PATH       wait (10 s at most) until PATH exists, so that a
+ *                       test can release several hosts at the same moment
  *
  * Words after "--" are not calls: that is where a launcher's
  * --userUuid--... and --gameId--... arguments go. The callback is registered
@@ -35,6 +37,7 @@ static library_t open_library(const char *path) { return LoadLibraryA(path); }
 static void *find_symbol(library_t lib, const char *name) {
   return (void *)(uintptr_t)GetProcAddress(lib, name);
 }
+static void pause_briefly(void) { Sleep(1); }
 static int own_directory(char *out, size_t size) {
   DWORD n = GetModuleFileNameA(NULL, out, (DWORD)size);
   if (n == 0 || n >= size) return 0;
@@ -44,11 +47,16 @@ static int own_directory(char *out, size_t size) {
 }
 #else
 #include <dlfcn.h>
+#include <time.h>
 #include <unistd.h>
 typedef void *library_t;
 #define LIBRARY_NAME "libOrvaneSDK.so"
 static library_t open_library(const char *path) { return dlopen(path, RTLD_NOW | RTLD_LOCAL); }
 static void *find_symbol(library_t lib, const char *name) { return dlsym(lib, name); }
+static void pause_briefly(void) {
+  struct timespec t = {0, 200 * 1000};
+  nanosleep(&t, NULL);
+}
 static int own_directory(char *out, size_t size) {
   ssize_t n = readlink("/proc/self/exe", out, size - 1);
   if (n <= 0) return 0;
@@ -144,6 +152,18 @@ static int demo(void) {
   return failures ? 1 : 0;
 }
 
+static void wait_for(const char *path) {
+  for (int i = 0; i < 50000; ++i) {
+    FILE *f = fopen(path, "rb");
+    if (f) {
+      fclose(f);
+      return;
+    }
+    pause_briefly();
+  }
+  fprintf(stderr, "orvane-host: %s did not appear\n", path);
+}
+
 static int need(int argc, int i, int count, const char *call) {
   if (i + count < argc) return 1;
   fprintf(stderr, "orvane-host: %s needs %d argument(s)\n", call, count);
@@ -193,6 +213,9 @@ int main(int argc, char **argv) {
       if (!need(last, i, 3, call)) return 2;
       status |= show_event("oAnalyticsSpecial", sdk.special(argv[i + 1], argv[i + 2], argv[i + 3])) != 0;
       i += 3;
+    } else if (strcmp(call, "wait-for") == 0) {
+      if (!need(last, i, 1, call)) return 2;
+      wait_for(argv[++i]);
     } else if (strcmp(call, "uuid") == 0) {
       show_identity("oAuthGetUserUuid", sdk.user_uuid(), 0);
     } else if (strcmp(call, "gameid") == 0) {

@@ -1,0 +1,44 @@
+#!/usr/bin/env bash
+# The whole test run, as CI does it: the Linux build with warnings as errors,
+# its tests plain, under AddressSanitizer + UBSan and under ThreadSanitizer,
+# the Windows DLL under wine, then each fuzzer for a bounded time.
+#   scripts/test.sh            everything
+#   scripts/test.sh quick      the Linux build and its tests only
+set -euo pipefail
+cd "$(dirname "$0")/.."
+mode="${1:-all}"
+jobs=2
+
+step() { printf '\n==== %s ====\n' "$*"; }
+
+if [ "$mode" = quick ]; then scripts/install-deps.sh linux; else scripts/install-deps.sh all; fi
+
+step "Linux build (warnings are errors)"
+cmake --preset ci >/dev/null
+cmake --build --preset ci -j "$jobs"
+step "Linux tests"
+ctest --preset ci -j "$jobs"
+
+[ "$mode" = quick ] && exit 0
+
+step "AddressSanitizer + UndefinedBehaviorSanitizer"
+cmake --preset asan -DORVANE_WARNINGS_AS_ERRORS=ON >/dev/null
+cmake --build --preset asan -j "$jobs"
+ctest --preset asan -j "$jobs"
+
+step "ThreadSanitizer"
+cmake --preset tsan -DORVANE_WARNINGS_AS_ERRORS=ON >/dev/null
+cmake --build --preset tsan -j "$jobs"
+ctest --preset tsan -j "$jobs"
+
+if [ -x scripts/ci-windows.sh ]; then
+  step "Windows DLL under wine"
+  scripts/ci-windows.sh
+fi
+
+if [ -x scripts/fuzz.sh ]; then
+  step "Fuzzers"
+  scripts/fuzz.sh "${ORVANE_FUZZ_SECONDS:-60}"
+fi
+
+step "All legs passed"
