@@ -2,20 +2,61 @@
 
 #include "analytics/timestamp.h"
 
+#include <cstdint>
+#include <cstring>
+
 namespace orvane {
 namespace {
 
 // Nonzero for the bytes that JSON forbids raw inside a string.
 constexpr bool NeedsEscape(unsigned char c) { return c < 0x20 || c == '"' || c == '\\'; }
 
+// Index of the first byte of `value` that needs an escape, or its size.
+// Eight bytes at a time: a word is looked at byte by byte only when it holds
+// a byte below 0x20, a quote or a backslash, which ids and time stamps
+// almost never do.
+std::size_t FirstToEscape(std::string_view value) {
+  constexpr std::uint64_t kOnes = 0x0101010101010101;
+  constexpr std::uint64_t kHigh = 0x8080808080808080;
+  std::size_t i = 0;
+  for (; i + 8 <= value.size(); i += 8) {
+    std::uint64_t word;
+    std::memcpy(&word, value.data() + i, 8);
+    // (x - n per byte) & ~x keeps a high bit set only when some byte of x is
+    // below n; it can mark the wrong byte, never a word without one, so a
+    // marked word is searched byte by byte.
+    const std::uint64_t quote = word ^ (kOnes * '"');
+    const std::uint64_t backslash = word ^ (kOnes * '\\');
+    const std::uint64_t hit = (((word - kOnes * 0x20) & ~word) | ((quote - kOnes) & ~quote) |
+                               ((backslash - kOnes) & ~backslash)) &
+                              kHigh;
+    if (hit != 0) break;
+  }
+  for (; i < value.size(); ++i)
+    if (NeedsEscape(static_cast<unsigned char>(value[i]))) return i;
+  return value.size();
+}
+
+// The record's five members in order; each value stands between its prefix
+// and the next prefix (or the closing text).
+constexpr std::string_view kMemberPrefix[5] = {"{\"user_id\":\"", "\",\"game_id\":\"",
+                                               "\",\"type\":\"", "\",\"time\":\"",
+                                               "\",\"extra\":\""};
+constexpr std::string_view kRecordEnd = "\"}";
+
+char *Put(char *p, std::string_view text) {
+  if (!text.empty()) std::memcpy(p, text.data(), text.size()); // an empty view may hold null
+  return p + text.size();
+}
+
 } // namespace
 
 void AppendJsonEscaped(std::string &out, std::string_view value) {
   static constexpr char kHex[] = "0123456789abcdef";
   std::size_t run = 0; // start of the bytes not yet copied
-  for (std::size_t i = 0; i < value.size(); ++i) {
+  for (std::size_t i = FirstToEscape(value); i < value.size();
+       i = run + FirstToEscape(value.substr(run))) {
     const unsigned char c = static_cast<unsigned char>(value[i]);
-    if (!NeedsEscape(c)) continue;
     out.append(value.data() + run, i - run);
     run = i + 1;
     switch (c) {
@@ -37,17 +78,28 @@ void AppendJsonEscaped(std::string &out, std::string_view value) {
 
 void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,
                        std::string_view type, std::string_view time, std::string_view extra) {
-  out += "{\"user_id\":\"";
-  AppendJsonEscaped(out, user_id);
-  out += "\",\"game_id\":\"";
-  AppendJsonEscaped(out, game_id);
-  out += "\",\"type\":\"";
-  AppendJsonEscaped(out, type);
-  out += "\",\"time\":\"";
-  AppendJsonEscaped(out, time);
-  out += "\",\"extra\":\"";
-  AppendJsonEscaped(out, extra);
-  out += "\"}";
+  const std::string_view values[5] = {user_id, game_id, type, time, extra};
+  std::size_t size = kRecordEnd.size();
+  bool plain = true;
+  for (int k = 0; k < 5; ++k) {
+    size += kMemberPrefix[k].size() + values[k].size();
+    plain = plain && FirstToEscape(values[k]) == values[k].size();
+  }
+  if (!plain) {
+    for (int k = 0; k < 5; ++k) {
+      out += kMemberPrefix[k];
+      AppendJsonEscaped(out, values[k]);
+    }
+    out += kRecordEnd;
+    return;
+  }
+  // Nothing to escape, the usual case: the size is known, so the text is
+  // copied in place after one resize.
+  const std::size_t start = out.size();
+  out.resize(start + size);
+  char *p = out.data() + start;
+  for (int k = 0; k < 5; ++k) p = Put(Put(p, kMemberPrefix[k]), values[k]);
+  Put(p, kRecordEnd);
 }
 
 std::string ComposeEventRecord(std::string_view game_id, std::string_view user_id,
