@@ -11,30 +11,47 @@ namespace {
 // Nonzero for the bytes that JSON forbids raw inside a string.
 constexpr bool NeedsEscape(unsigned char c) { return c < 0x20 || c == '"' || c == '\\'; }
 
-// Index of the first byte of `value` that needs an escape, or its size.
-// Eight bytes at a time: a word is looked at byte by byte only when it holds
-// a byte below 0x20, a quote or a backslash, which ids and time stamps
-// almost never do.
-std::size_t FirstToEscape(std::string_view value) {
-  constexpr std::uint64_t kOnes = 0x0101010101010101;
-  constexpr std::uint64_t kHigh = 0x8080808080808080;
-  std::size_t i = 0;
-  for (; i + 8 <= value.size(); i += 8) {
-    std::uint64_t word;
-    std::memcpy(&word, value.data() + i, 8);
-    // (x - n per byte) & ~x keeps a high bit set only when some byte of x is
-    // below n; it can mark the wrong byte, never a word without one, so a
-    // marked word is searched byte by byte.
-    const std::uint64_t quote = word ^ (kOnes * '"');
-    const std::uint64_t backslash = word ^ (kOnes * '\\');
-    const std::uint64_t hit = (((word - kOnes * 0x20) & ~word) | ((quote - kOnes) & ~quote) |
-                               ((backslash - kOnes) & ~backslash)) &
-                              kHigh;
-    if (hit != 0) break;
-  }
+struct EscapeTable {
+  bool needed[256];
+};
+constexpr EscapeTable MakeEscapeTable() {
+  EscapeTable table{};
+  for (int c = 0; c < 256; ++c) table.needed[c] = NeedsEscape(static_cast<unsigned char>(c));
+  return table;
+}
+constexpr EscapeTable kEscape = MakeEscapeTable();
+
+std::size_t FirstToEscapeFrom(std::string_view value, std::size_t i) {
   for (; i < value.size(); ++i)
-    if (NeedsEscape(static_cast<unsigned char>(value[i]))) return i;
-  return value.size();
+    if (kEscape.needed[static_cast<unsigned char>(value[i])]) break;
+  return i;
+}
+
+// True when one of the eight bytes is below 0x20, a quote or a backslash.
+// (x - n per byte) & ~x keeps a high bit set only when some byte of x is
+// below n; it can mark the wrong byte, never a word without one.
+bool WordNeedsEscape(const char *eight) {
+  constexpr std::uint64_t kOnes = 0x0101010101010101;
+  std::uint64_t word;
+  std::memcpy(&word, eight, 8);
+  const std::uint64_t quote = word ^ (kOnes * '"');
+  const std::uint64_t backslash = word ^ (kOnes * '\\');
+  return ((((word - kOnes * 0x20) & ~word) | ((quote - kOnes) & ~quote) |
+           ((backslash - kOnes) & ~backslash)) &
+          (kOnes * 0x80)) != 0;
+}
+
+// Index of the first byte of `value` that needs an escape, or its size.
+// Eight bytes at a time, the last word overlapping the one before: a byte by
+// byte search runs only for short values and for a word that holds a byte to
+// escape, which ids and time stamps almost never do.
+std::size_t FirstToEscape(std::string_view value) {
+  const std::size_t size = value.size();
+  if (size < 8) return FirstToEscapeFrom(value, 0);
+  std::size_t i = 0;
+  for (; i + 8 < size; i += 8)
+    if (WordNeedsEscape(value.data() + i)) return FirstToEscapeFrom(value, i);
+  return WordNeedsEscape(value.data() + size - 8) ? FirstToEscapeFrom(value, i) : size;
 }
 
 // The record's five members in order; each value stands between its prefix

@@ -35,16 +35,15 @@ void MessageBatch::Add(LogLevel level, const char *text) noexcept {
 
 void MessageBatch::AddOwned(LogLevel level, std::string text) {
   if (count == kCapacity) return;
-  Entry &entry = entries[count];
-  entry.level = level;
-  entry.owned = std::move(text);
-  entry.text = entry.owned.c_str();
+  owned.push_front(std::move(text));
+  entries[count].level = level;
+  entries[count].text = owned.front().c_str();
   ++count;
 }
 
 void MessageBatch::Deliver() noexcept {
   for (std::size_t i = 0; i < count; ++i) LogToHost(entries[i].level, entries[i].text);
-  for (std::size_t i = 0; i < count; ++i) entries[i].owned.clear();
+  owned.clear();
   count = 0;
 }
 

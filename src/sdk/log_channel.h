@@ -6,6 +6,7 @@
 
 #include <array>
 #include <cstddef>
+#include <forward_list>
 #include <string>
 
 namespace orvane {
@@ -23,13 +24,17 @@ void RegisterForLogs(LogCallback callback) noexcept;
 struct MessageBatch {
   struct Entry {
     LogLevel level;
-    const char *text;  // a constant text, or owned.c_str()
-    std::string owned; // for texts assembled at run time
+    const char *text; // a constant text, or one of `owned`
   };
   // More than one call ever sends: a first event on a new machine sends five.
   static constexpr std::size_t kCapacity = 8;
-  std::array<Entry, kCapacity> entries{};
+  // Only the first `count` entries are set: every exported call makes a
+  // batch, so one must cost next to nothing to make and to drop.
+  std::array<Entry, kCapacity> entries;
   std::size_t count = 0;
+  // Texts assembled at run time (rare: failures only). List nodes never
+  // move, so entries can point into them.
+  std::forward_list<std::string> owned;
 
   // `text` must outlive the batch (a literal).
   void Add(LogLevel level, const char *text) noexcept;
