@@ -121,7 +121,8 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  * A game id must be usable as a file name on every platform: it is refused
  * when it is "." or "..", holds a byte below 0x20 or one of / \ : * ? " < > |,
  * ends in "." or " ", or its part before the first "." is a Windows device
- * name (CON, PRN, AUX, NUL, COM0-COM9, LPT0-LPT9, any case).
+ * name (CON, PRN, AUX, NUL, CONIN$, CONOUT$, COM0-COM9, LPT0-LPT9, also
+ * with blanks before the extension or a superscript port digit, any case).
  */
 ORVANE_API int32_t ORVANE_CALL oAnalyticsInit(const char *gameId, const char *userId);
 ORVANE_API int32_t ORVANE_CALL oAnalyticsGameEnter(const char *gameId, const char *userId);

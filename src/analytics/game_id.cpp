@@ -12,13 +12,22 @@ bool EqualsIgnoringCase(std::string_view a, std::string_view upper) {
   return true;
 }
 
-// Windows opens the device for these names whatever extension follows.
+// Windows opens the device for these names whatever extension follows, also
+// with blanks before the extension ("NUL .log"), and counts the superscript
+// digits 1, 2 and 3 (0xB9, 0xB2, 0xB3 in Windows-1252, after 0xC2 in UTF-8)
+// as COM and LPT port numbers.
 bool IsDeviceName(std::string_view stem) {
-  for (std::string_view name : {"CON", "PRN", "AUX", "NUL"})
+  while (!stem.empty() && stem.back() == ' ') stem.remove_suffix(1);
+  for (std::string_view name : {"CON", "PRN", "AUX", "NUL", "CONIN$", "CONOUT$"})
     if (EqualsIgnoringCase(stem, name)) return true;
-  if (stem.size() == 4 && stem[3] >= '0' && stem[3] <= '9')
-    return EqualsIgnoringCase(stem.substr(0, 3), "COM") || EqualsIgnoringCase(stem.substr(0, 3), "LPT");
-  return false;
+  if (stem.size() < 4 ||
+      (!EqualsIgnoringCase(stem.substr(0, 3), "COM") && !EqualsIgnoringCase(stem.substr(0, 3), "LPT")))
+    return false;
+  std::string_view digit = stem.substr(3);
+  if (digit.size() == 2 && digit[0] == '\xc2') digit.remove_prefix(1);
+  if (digit.size() != 1) return false;
+  const unsigned char d = static_cast<unsigned char>(digit[0]);
+  return (d >= '0' && d <= '9') || d == 0xb9 || d == 0xb2 || d == 0xb3;
 }
 
 } // namespace
