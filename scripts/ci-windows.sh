@@ -15,13 +15,15 @@ cmake --build --preset windows -j "$jobs"
 
 # One wine session for the whole run, begun before ctest and detached from its
 # output. Creating a prefix inside a test would hang ctest: wine's services
-# outlive the test and hold its output pipe. wineboot creates (or updates) the
-# prefix and wineserver -w waits for that session to end; then a persistent
-# wineserver, its standard streams away from ctest's, keeps every test's wine
-# start fast. It is stopped however this script ends.
+# outlive the test and hold its output pipe. wineboot -i creates (or updates)
+# the prefix and wineserver -w waits for that session to end. Then a
+# persistent wineserver keeps every test's wine start fast, and wineboot
+# starts the session's services, both with their standard streams away from
+# ctest's. The server is stopped however this script ends.
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
-wineboot -i >/dev/null 2>&1
+wineboot -i </dev/null >/dev/null 2>&1
 wineserver -w
 wineserver -p </dev/null >/dev/null 2>&1
+wineboot </dev/null >/dev/null 2>&1
 
 ctest --preset windows -j "$jobs"
