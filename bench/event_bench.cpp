@@ -3,8 +3,8 @@
 // Besides the Google Benchmark runs, the binary measures oAnalyticsGameEnter
 // and the floor (the bare system calls of one event) in interleaved rounds
 // and prints the median ratio; --ratio_rounds=0 skips that.
-//   --ratio_rounds=N   rounds (default 41)
-//   --ratio_batch=N    events per side and round (default 2000)
+//   --ratio_rounds=N   rounds (default 101)
+//   --ratio_batch=N    events per side and round (default 500)
 // It restarts itself once with a 4 KiB command line, so that the identity
 // lookup reads a launcher-sized one.
 #include "bench_sandbox.h"
@@ -220,8 +220,8 @@ int IntFlag(int &argc, char **argv, const char *name, int fallback) {
 
 int main(int argc, char **argv) {
   RestartWithLongCommandLine(argc, argv);
-  const int rounds = IntFlag(argc, argv, "--ratio_rounds", 41);
-  const int batch = IntFlag(argc, argv, "--ratio_batch", 2000);
+  const int rounds = IntFlag(argc, argv, "--ratio_rounds", 101);
+  const int batch = IntFlag(argc, argv, "--ratio_batch", 500);
   benchmark::Initialize(&argc, argv);
 
   EventSetup setup = PrepareEvents();
