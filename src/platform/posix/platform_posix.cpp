@@ -1,6 +1,7 @@
 // POSIX implementation of the platform table.
 #include "platform/platform.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <ctime>
@@ -97,18 +98,17 @@ bool ArgumentListPosix(ArgumentList &args) {
     bytes.append(chunk, static_cast<std::size_t>(n));
   }
   ::close(fd);
-  // Every argument ends in a zero byte; each byte becomes one unit so that
-  // narrowing gives the argument's bytes back unchanged.
-  std::u16string current;
-  for (char c : bytes) {
-    if (c == '\0') {
-      args.push_back(std::move(current));
-      current.clear();
-    } else {
-      current.push_back(static_cast<char16_t>(static_cast<unsigned char>(c)));
-    }
+  // Every argument ends in a zero byte (the last may not); each byte becomes
+  // one unit so that narrowing gives the argument's bytes back unchanged.
+  args.reserve(static_cast<std::size_t>(std::count(bytes.begin(), bytes.end(), '\0')) + 1);
+  for (std::size_t start = 0; start < bytes.size();) {
+    std::size_t end = bytes.find('\0', start);
+    if (end == std::string::npos) end = bytes.size();
+    std::u16string &arg = args.emplace_back(end - start, u'\0');
+    for (std::size_t i = start; i < end; ++i)
+      arg[i - start] = static_cast<char16_t>(static_cast<unsigned char>(bytes[i]));
+    start = end + 1;
   }
-  if (!current.empty()) args.push_back(std::move(current));
   return true;
 }
 
