@@ -40,26 +40,41 @@ std::string PadNumber(std::int64_t value, int width) {
   return digits;
 }
 
-std::string FormatTimestampAt(std::int64_t seconds) {
+namespace {
+
+// Writes the time stamp of `seconds` into `text`, reusing its buffer. Years
+// of four digits, all real clocks, are written digit by digit into place;
+// any other year takes the general padding, which keeps every digit.
+void FormatTimestampInto(std::string &text, std::int64_t seconds) {
   // Keeps the year within what the calendar arithmetic handles without
   // overflow; real clocks are nowhere near either end.
   constexpr std::int64_t kLimit = INT64_C(1) << 50;
   if (seconds > kLimit) seconds = kLimit;
   if (seconds < -kLimit) seconds = -kLimit;
   const CalendarTime t = UtcCalendar(seconds);
+  if (t.year < 0 || t.year > 9999) {
+    text = PadNumber(t.year, 4) + '-' + PadNumber(t.month, 2) + '-' + PadNumber(t.day, 2) + 'T' +
+           PadNumber(t.hour, 2) + ':' + PadNumber(t.minute, 2) + ':' + PadNumber(t.second, 2);
+    return;
+  }
+  char stamp[] = "0000-00-00T00:00:00";
+  const auto put = [&stamp](int at, std::int64_t value, int width) {
+    for (int i = at + width - 1; i >= at; --i, value /= 10) stamp[i] = static_cast<char>('0' + value % 10);
+  };
+  put(0, t.year, 4);
+  put(5, t.month, 2);
+  put(8, t.day, 2);
+  put(11, t.hour, 2);
+  put(14, t.minute, 2);
+  put(17, t.second, 2);
+  text.assign(stamp, sizeof stamp - 1);
+}
+
+} // namespace
+
+std::string FormatTimestampAt(std::int64_t seconds) {
   std::string text;
-  text.reserve(19);
-  text += PadNumber(t.year, 4);
-  text += '-';
-  text += PadNumber(t.month, 2);
-  text += '-';
-  text += PadNumber(t.day, 2);
-  text += 'T';
-  text += PadNumber(t.hour, 2);
-  text += ':';
-  text += PadNumber(t.minute, 2);
-  text += ':';
-  text += PadNumber(t.second, 2);
+  FormatTimestampInto(text, seconds);
   return text;
 }
 
@@ -68,7 +83,7 @@ std::string FormatTimestamp() { return FormatTimestampAt(platform::calls().now_s
 std::string_view TimestampCache::Now() {
   const std::int64_t now = platform::calls().now_seconds();
   if (now != seconds) {
-    text = FormatTimestampAt(now);
+    FormatTimestampInto(text, now);
     seconds = now;
   }
   return text;
