@@ -34,7 +34,7 @@ protected:
     const KeyBlock &block = GetKeyBlock();
     const std::string key(block.keyText.begin(), block.keyText.end());
     static const std::regex time(R"("time":"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d")");
-    for (const std::string &line : SplitLines(*content)) {
+    for (const std::string &line : SplitLogLines(*content)) {
       std::optional<std::string> plain = DecryptLine(line, key);
       if (!plain) {
         records.push_back("(undecryptable: " + line + ")");
@@ -47,7 +47,7 @@ protected:
   std::vector<std::string> Files() const {
     std::vector<std::string> found;
     for (const auto &entry : std::filesystem::recursive_directory_iterator(base_))
-      found.push_back(entry.path().string().substr(base_.size()));
+      found.push_back(entry.path().lexically_relative(base_).generic_string().insert(0, 1, '/'));
     std::sort(found.begin(), found.end());
     return found;
   }

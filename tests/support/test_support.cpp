@@ -80,6 +80,21 @@ std::vector<std::string> SplitLines(std::string_view text) {
   }
 }
 
+std::vector<std::string> SplitLogLines(std::string_view text) {
+  const std::string_view separator = platform::line_break();
+  std::vector<std::string> lines;
+  std::size_t start = 0;
+  for (;;) {
+    const std::size_t end = text.find(separator, start);
+    if (end == std::string_view::npos) {
+      lines.emplace_back(text.substr(start));
+      return lines;
+    }
+    lines.emplace_back(text.substr(start, end - start));
+    start = end + separator.size();
+  }
+}
+
 std::string KeyTextFor(std::string_view key_game_id) {
   std::string key = "OrvaneLogKey-01";
   key += key_game_id.substr(0, 65);

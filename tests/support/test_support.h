@@ -36,6 +36,9 @@ bool Exists(const std::string &path);
 
 // Splits on "\n" exactly: "a\nb" gives {a, b}, "" gives {""}.
 std::vector<std::string> SplitLines(std::string_view text);
+// Splits a log file on this platform's line break (CR LF on Windows); a lone
+// line feed stays inside its line.
+std::vector<std::string> SplitLogLines(std::string_view text);
 
 // The 80-byte key text for `key_game_id`, built here from the log format's
 // rule rather than by the library: "OrvaneLogKey-01" + first 65 bytes.
