@@ -23,8 +23,16 @@ export UBSAN_OPTIONS="print_stacktrace=1:halt_on_error=1:${UBSAN_OPTIONS:-}"
 for target in record game_id marker; do
   printf '\n==== %s_fuzzer, %s s ====\n' "$target" "$seconds"
   mkdir -p "$work/$target"
-  "$build/bin/${target}_fuzzer" \
-    -max_total_time="$seconds" -rss_limit_mb=1024 -timeout=10 -print_final_stats=1 \
-    -artifact_prefix="$artifacts/${target}-" \
-    "$work/$target" "fuzz/corpus/$target"
+  # libFuzzer reports every new input; keep that in a file and show the
+  # summary, or the end of the report when the target failed.
+  log="$build/${target}_fuzzer.log"
+  if ! "$build/bin/${target}_fuzzer" \
+      -max_total_time="$seconds" -rss_limit_mb=1024 -timeout=10 -print_final_stats=1 \
+      -artifact_prefix="$artifacts/${target}-" \
+      "$work/$target" "fuzz/corpus/$target" >"$log" 2>&1; then
+    tail -n 60 "$log"
+    echo "${target}_fuzzer failed; the input is in $artifacts" >&2
+    exit 1
+  fi
+  grep -E '^(Done|stat::number_of_executed_units|stat::average_exec_per_sec|stat::peak_rss_mb)' "$log"
 done
