@@ -5,7 +5,8 @@ set -euo pipefail
 
 packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind)
 if [ "${1:-all}" = all ]; then
-  packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64)
+  # wine answers the DLL's CNG calls with GnuTLS, a recommendation only.
+  packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30)
 fi
 
 missing=()
