@@ -114,9 +114,5 @@ std::string EncodeEventRecord(std::string_view game_id, std::string_view user_id
   return hex;
 }
 
-std::string EncodeEventRecordNoExtra(std::string_view game_id, std::string_view user_id,
-                                     std::string_view type) {
-  return EncodeEventRecord(game_id, user_id, type, {});
-}
 
 } // namespace orvane

@@ -33,9 +33,9 @@ bool EncryptRecordText(std::string_view record, std::string &hex);
 void AppendHex(std::string &out, const std::uint8_t *bytes, std::size_t size);
 
 // The hex line of one event stamped now; an empty text when the cipher failed.
+// The event path composes into its own buffers instead; this serves callers
+// that want one line.
 std::string EncodeEventRecord(std::string_view game_id, std::string_view user_id,
                               std::string_view type, std::string_view extra);
-std::string EncodeEventRecordNoExtra(std::string_view game_id, std::string_view user_id,
-                                     std::string_view type);
 
 } // namespace orvane

@@ -26,7 +26,7 @@ struct MessageBatch {
     LogLevel level;
     const char *text; // a constant text, or one of `owned`
   };
-  // More than one call ever sends: a first event on a new machine sends five.
+  // More than any call ever sends: a first event on a new machine sends five.
   static constexpr std::size_t kCapacity = 8;
   // Only the first `count` entries are set: every exported call makes a
   // batch, so one must cost next to nothing to make and to drop.
