@@ -94,6 +94,7 @@ BENCHMARK(BM_GameEnter);
 // into buffers reused as the recorder reuses its own.
 void BM_RecordLine(benchmark::State &state) {
   orvane::TimestampCache clock;
+  orvane::RecordCipher cipher;
   std::string record, line;
   orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.Now(), "");
   const std::size_t wanted = static_cast<std::size_t>(state.range(0));
@@ -102,7 +103,7 @@ void BM_RecordLine(benchmark::State &state) {
     record.clear();
     line.clear();
     orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.Now(), extra);
-    if (!orvane::EncryptRecordText(record, line)) std::abort();
+    if (!orvane::EncryptRecordText(cipher, record, line)) std::abort();
     benchmark::DoNotOptimize(line.data());
   }
   state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(record.size()));

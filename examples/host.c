@@ -17,6 +17,8 @@
  *   gameid              oAuthGetGameId
  *   wait-for PATH       wait (10 s at most) until PATH exists, so that a
  *                       test can release several hosts at the same moment
+ *   exit-at-exit GAME USER   oAnalyticsGameExit from an exit handler that
+ *                       was registered before the library was loaded
  *
  * Words after "--" are not calls: that is where a launcher's
  * --userUuid--... and --gameId--... arguments go. The callback is registered
@@ -164,6 +166,13 @@ static void wait_for(const char *path) {
   fprintf(stderr, "orvane-host: %s did not appear\n", path);
 }
 
+/* Games often record their EXIT from an exit handler, which runs after the
+ * library's own exit-time clean-up would have (it was registered first). */
+static const char *exit_game, *exit_user;
+static void record_exit_at_exit(void) {
+  if (exit_game) show_event("oAnalyticsGameExit", sdk.exit(exit_game, exit_user));
+}
+
 static int need(int argc, int i, int count, const char *call) {
   if (i + count < argc) return 1;
   fprintf(stderr, "orvane-host: %s needs %d argument(s)\n", call, count);
@@ -180,6 +189,7 @@ int main(int argc, char **argv) {
   int last = first; /* calls are argv[first .. last) */
   while (last < argc && strcmp(argv[last], "--") != 0) ++last;
 
+  atexit(record_exit_at_exit);
   if (!load(library)) return 2;
   setvbuf(stdout, NULL, _IOLBF, 0);
 
@@ -216,6 +226,11 @@ int main(int argc, char **argv) {
     } else if (strcmp(call, "wait-for") == 0) {
       if (!need(last, i, 1, call)) return 2;
       wait_for(argv[++i]);
+    } else if (strcmp(call, "exit-at-exit") == 0) {
+      if (!need(last, i, 2, call)) return 2;
+      exit_game = argv[i + 1];
+      exit_user = argv[i + 2];
+      i += 2;
     } else if (strcmp(call, "uuid") == 0) {
       show_identity("oAuthGetUserUuid", sdk.user_uuid(), 0);
     } else if (strcmp(call, "gameid") == 0) {

@@ -18,3 +18,12 @@ if(NOT found STREQUAL expected)
   message(FATAL_ERROR "exported symbols differ\n  expected: ${expected}\n  found:    ${found}")
 endif()
 message(STATUS "exports: ${found}")
+
+# Loading the library runs nothing of its own (no file is read at load) and
+# registers nothing to destroy at exit, so that calls from the game's exit
+# handlers and static destructors still find every process-wide state.
+execute_process(COMMAND nm ${LIBRARY} OUTPUT_VARIABLE symbols)
+string(REGEX MATCHALL "(_GLOBAL__sub_I_[^\n]*|__cxa_atexit|__cxa_thread_atexit[^\n]*)" load_or_exit "${symbols}")
+if(load_or_exit)
+  message(FATAL_ERROR "the library runs code at load or at exit: ${load_or_exit}")
+endif()

@@ -131,45 +131,5 @@ TEST_F(ConcurrencyTest, OneInitLinePerLogAcrossProcesses) {
   }
 }
 
-// Another process writes the INIT line between this call's size check and its
-// lock: measured again under the lock, the log is no longer empty, so no
-// second INIT line follows.
-std::string g_rival_path;
-bool RivalWinsThenLock(platform::FileHandle file) {
-  const platform::FileHandle rival = platform::native_calls().open_append(g_rival_path.c_str());
-  platform::native_calls().append(rival, "rival-init", 10);
-  platform::native_calls().close_file(rival);
-  return platform::native_calls().lock_file(file);
-}
-
-TEST_F(ConcurrencyTest, SizeIsTakenAgainUnderTheLock) {
-  g_rival_path = LogPath("g1");
-  platform::calls().lock_file = RivalWinsThenLock;
-  RegisterForLogs(CaptureMessage);
-  Captured().clear();
-  EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  EXPECT_EQ(Captured(), (std::vector<Message>{{0, "[OrvaneSDK] Analytics ENTER - OK"}}));
-  const std::vector<std::string> lines = SplitLines(*ReadFile(LogPath("g1")));
-  ASSERT_EQ(lines.size(), 2u);
-  EXPECT_EQ(lines[0], "rival-init");
-}
-
-// The lock is held per open file, so a second handle, as another process
-// would have, waits a bounded time and then goes on without it.
-TEST_F(ConcurrencyTest, LockWaitIsBounded) {
-  const platform::Calls &os = platform::native_calls();
-  const platform::FileHandle first = os.open_append(LogPath("g1").c_str());
-  const platform::FileHandle second = os.open_append(LogPath("g1").c_str());
-  ASSERT_TRUE(os.lock_file(first));
-  const auto start = std::chrono::steady_clock::now();
-  EXPECT_FALSE(os.lock_file(second));
-  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
-  os.unlock_file(first);
-  EXPECT_TRUE(os.lock_file(second));
-  os.unlock_file(second);
-  os.close_file(first);
-  os.close_file(second);
-}
-
 } // namespace
 } // namespace orvane::testing

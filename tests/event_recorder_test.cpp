@@ -14,6 +14,9 @@
 namespace orvane::testing {
 namespace {
 
+std::string g_logs_of_this_test;
+const std::string &LogsOfThisTest() { return g_logs_of_this_test; }
+
 class RecorderTest : public SandboxTest {
 protected:
   void SetUp() override {
@@ -30,14 +33,14 @@ protected:
   std::vector<std::string> Records(std::string_view game_id) {
     std::vector<std::string> records;
     const std::optional<std::string> content = ReadFile(LogPath(game_id));
-    if (!content) return records;
+    if (!content || content->empty()) return records;
     const KeyBlock &block = GetKeyBlock();
     const std::string key(block.keyText.begin(), block.keyText.end());
     static const std::regex time(R"("time":"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d")");
     for (const std::string &line : SplitLogLines(*content)) {
       std::optional<std::string> plain = DecryptLine(line, key);
       if (!plain) {
-        records.push_back("(undecryptable: " + line + ")");
+        records.push_back("(undecryptable)");
         continue;
       }
       records.push_back(std::regex_replace(*plain, time, "\"time\":\"T\""));
@@ -159,14 +162,19 @@ TEST_F(RecorderTest, RefusedCallsSendOneErrorAndTouchNothing) {
 
 TEST_F(RecorderTest, HostileGameIdsWriteNothingAnywhere) {
   std::filesystem::create_directories(where_.logs);
-  const std::string ids[] = {"../x", "..\\..\\x", "..", ".", "CON", "nul.txt", "com1", "a|b",
-                             "a:b", "sub/dir", "x.", "x ", "tab\there", "/abs"};
-  for (const std::string &id : ids) {
+  // Control bytes are shown as \xNN, so that an id cannot forge lines in the
+  // host's own log.
+  const std::pair<std::string, std::string> ids[] = {
+      {"../x", "../x"}, {"..\\..\\x", "..\\..\\x"}, {"..", ".."}, {".", "."}, {"CON", "CON"},
+      {"nul.txt", "nul.txt"}, {"com1", "com1"}, {"a|b", "a|b"}, {"a:b", "a:b"}, {"sub/dir", "sub/dir"},
+      {"x.", "x."}, {"x ", "x "}, {"/abs", "/abs"}, {"tab\there\x7f", "tab\\x09here\\x7f"},
+      {"x\n[OrvaneSDK] y - OK\x1b[2K", "x\\x0a[OrvaneSDK] y - OK\\x1b[2K"}};
+  for (const auto &[id, shown] : ids) {
     SCOPED_TRACE(id);
     Captured().clear();
     EXPECT_EQ(oAnalyticsInit(id.c_str(), "u1"), -1);
     EXPECT_EQ(Captured(),
-              std::vector<Message>{Err("INIT", "log file failed to open. Maybe a bad game_id (" + id + ")?")});
+              std::vector<Message>{Err("INIT", "log file failed to open. Maybe a bad game_id (" + shown + ")?")});
   }
   EXPECT_EQ(Files(), (std::vector<std::string>{"/share", "/share/Orvane", "/share/Orvane/Logs"}));
 }
@@ -203,20 +211,59 @@ TEST_F(RecorderTest, NoCallbackSameFiles) {
 }
 
 // Failures injected into single platform and cipher calls.
-int g_calls_left; // calls that succeed before the one injected failure
-bool Spend() { return g_calls_left-- != 0; }
-platform::FileHandle FailingOpen(const char *path) {
-  return Spend() ? platform::native_calls().open_append(path) : platform::kNoFile;
+int g_calls_left; // calls that succeed before the injected failures begin
+bool Spend() { return g_calls_left-- > 0; }
+const platform::Calls &Os() { return platform::native_calls(); }
+platform::FileHandle FailingOpen(const char *path, std::int64_t &size) {
+  return Spend() ? Os().open_log(path, size) : platform::kNoFile;
 }
-bool FailingAppend(platform::FileHandle f, const void *d, std::size_t n) {
-  return Spend() && platform::native_calls().append(f, d, n);
+// Another process makes the logs directory while this open fails.
+platform::FileHandle OpenRacingAnotherProcess(const char *path, std::int64_t &size) {
+  const std::filesystem::path logs = std::filesystem::path(path).parent_path();
+  if (std::filesystem::exists(logs)) return Os().open_log(path, size);
+  std::filesystem::create_directories(logs);
+  return platform::kNoFile;
 }
-bool FailingClose(platform::FileHandle f) { return platform::native_calls().close_file(f) && Spend(); }
-std::int64_t FailingSize(platform::FileHandle) { return -1; }
+platform::FileHandle OpenOfUnknownSize(const char *path, std::int64_t &size) {
+  const platform::FileHandle file = Os().open_log(path, size);
+  size = -1;
+  return file;
+}
+// A full disk: half the line goes in.
+bool ShortAppend(platform::FileHandle f, const void *d, std::size_t n) {
+  if (Spend()) return Os().append(f, d, n);
+  Os().append(f, d, n / 2);
+  return false;
+}
+bool ThrowingAppend(platform::FileHandle, const void *, std::size_t) { throw std::bad_alloc(); }
+bool FailingClose(platform::FileHandle f) { return Os().close_file(f) && Spend(); }
 bool FailingMakeDirectory(const char *) { return false; }
-bool FailingLock(platform::FileHandle) { return false; }
-platform::FileHandle ThrowingOpen(const char *) { throw std::bad_alloc(); }
+platform::FileHandle ThrowingOpen(const char *, std::int64_t &) { throw std::bad_alloc(); }
 std::ptrdiff_t FailingEncrypt(cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) { return -1; }
+// Another writer holds the lock for longer than the wait; time moves 100 ms
+// per reading of the clock, whatever the pauses do.
+int g_lock_tries;
+std::int64_t g_now_ms;
+platform::LockResult BusyLock(platform::FileHandle) { return ++g_lock_tries, platform::LockResult::kBusy; }
+std::int64_t FastClock() { return g_now_ms += 100; }
+void NoPause(int) {}
+// Another writer starts the log while this call waits for the lock.
+platform::LockResult RivalStartsTheLog(platform::FileHandle) {
+  std::int64_t size = 0;
+  const platform::FileHandle rival = Os().open_log((LogsOfThisTest() + "g1.log").c_str(), size);
+  if (size == 0) Os().append(rival, "rival-init", 10);
+  Os().close_file(rival);
+  return BusyLock(rival);
+}
+platform::LockResult RivalStartsTheLogThenYields(platform::FileHandle file) {
+  RivalStartsTheLog(file);
+  return Os().try_lock_file(file);
+}
+void InjectBusyLock(platform::LockResult (*lock)(platform::FileHandle)) {
+  platform::calls().try_lock_file = lock;
+  platform::calls().steady_milliseconds = FastClock;
+  platform::calls().sleep_milliseconds = NoPause;
+}
 
 TEST_F(RecorderTest, InjectedFailuresAreReportedNeverOk) {
   struct Case {
@@ -229,32 +276,40 @@ TEST_F(RecorderTest, InjectedFailuresAreReportedNeverOk) {
     std::vector<std::string> records; // after the call
   };
   const std::string open_failed = "log file failed to open. Maybe a bad game_id (g1)?";
+  const Message not_initialised = Warn("ENTER", "log was never initialized. Initialized the game log");
   const Case cases[] = {
-      {"open fails", true, [] { platform::calls().open_append = FailingOpen; }, 0, -1,
+      {"open fails", true, [] { platform::calls().open_log = FailingOpen; }, 0, -1,
        {Err("ENTER", open_failed)}, {Rec("INIT")}},
-      {"write fails", true, [] { platform::calls().append = FailingAppend; }, 0, -1,
-       {Err("ENTER", "log file failed to write.")}, {Rec("INIT")}},
+      {"open fails while another process makes the directory: tried again", false,
+       [] {
+         std::filesystem::remove_all(LogsOfThisTest());
+         platform::calls().open_log = OpenRacingAnotherProcess;
+       },
+       0, 0, {not_initialised, Info("INIT", "OK"), Info("ENTER", "OK")},
+       {Rec("INIT"), Rec("ENTER")}},
+      {"write fails: the fragment stays apart", true, [] { platform::calls().append = ShortAppend; }, 0, -1,
+       {Err("ENTER", "log file failed to write.")}, {Rec("INIT"), "(undecryptable)"}},
+      {"first write fails: cut back, no INIT-less log", false, [] { platform::calls().append = ShortAppend; }, 0,
+       -1, {not_initialised, Err("INIT", "log file failed to write."), Err("ENTER", "log file failed to write.")},
+       {}},
       {"close fails", true, [] { platform::calls().close_file = FailingClose; }, 0, -1,
        {Err("ENTER", "log file failed to write.")}, {Rec("INIT"), Rec("ENTER")}},
       {"cipher fails", true, [] { cipher::backend().encrypt = FailingEncrypt; }, 0, -1,
        {Err("ENTER", "failed. Record encryption failed.")}, {Rec("INIT")}},
-      {"size unknown counts as not empty", false, [] { platform::calls().file_size = FailingSize; }, 0, 0,
-       {Info("ENTER", "OK")}, {"(undecryptable: )", Rec("ENTER")}},
-      {"lock unavailable: goes on without it", false, [] { platform::calls().lock_file = FailingLock; }, 0, 0,
-       {Warn("ENTER", "log was never initialized. Initialized the game log"), Info("INIT", "OK"),
-        Info("ENTER", "OK")},
-       {Rec("INIT"), Rec("ENTER")}},
-      {"nested INIT write fails, the event still goes in", false,
-       [] { platform::calls().append = FailingAppend; }, 0, 0,
-       {Warn("ENTER", "log was never initialized. Initialized the game log"),
-        Err("INIT", "log file failed to write."), Info("ENTER", "OK")},
-       {"(undecryptable: )", Rec("ENTER")}},
-      {"nested INIT open fails", false, [] { platform::calls().open_append = FailingOpen; }, 1, 0,
-       {Warn("ENTER", "log was never initialized. Initialized the game log"), Err("INIT", open_failed),
-        Info("ENTER", "OK")},
-       {"(undecryptable: )", Rec("ENTER")}},
-      {"an exception inside the call", true, [] { platform::calls().open_append = ThrowingOpen; }, 0, -1,
+      {"size unknown counts as not empty", false, [] { platform::calls().open_log = OpenOfUnknownSize; }, 0, 0,
+       {Info("ENTER", "OK")}, {"(undecryptable)", Rec("ENTER")}},
+      {"empty log locked by another writer past the deadline", false,
+       [] { InjectBusyLock(BusyLock); }, 0, -1, {Err("ENTER", "log file is locked by another process.")}, {}},
+      {"another writer starts the log during the wait: measured again, one line break", false,
+       [] { InjectBusyLock(RivalStartsTheLog); }, 0, 0, {Info("ENTER", "OK")}, {"(undecryptable)", Rec("ENTER")}},
+      {"another writer starts the log before the lock is had: measured again", false,
+       [] { InjectBusyLock(RivalStartsTheLogThenYields); }, 0, 0, {Info("ENTER", "OK")},
+       {"(undecryptable)", Rec("ENTER")}},
+      {"an exception inside the call", true, [] { platform::calls().open_log = ThrowingOpen; }, 0, -1,
        {Err("ENTER", "failed. Internal error.")}, {Rec("INIT")}},
+      {"an exception under the lock gives the lock back", false,
+       [] { platform::calls().append = ThrowingAppend; }, 0, -1,
+       {not_initialised, Err("ENTER", "failed. Internal error.")}, {}},
   };
   for (const Case &c : cases) {
     SCOPED_TRACE(c.name);
@@ -264,18 +319,29 @@ TEST_F(RecorderTest, InjectedFailuresAreReportedNeverOk) {
       ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
     }
     Captured().clear();
+    g_logs_of_this_test = where_.logs;
     c.inject();
     g_calls_left = c.calls_left;
+    g_lock_tries = 0;
     EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), c.result);
     platform::calls() = platform::native_calls();
     cipher::backend() = cipher::native_backend();
     EXPECT_EQ(Captured(), c.messages);
     EXPECT_EQ(Records("g1"), c.records);
+    EXPECT_LE(g_lock_tries, 11) << "the wait is bounded by time, not by tries";
     // The recorder is whole again: the next event goes through.
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameExit("g1", "u1"), 0);
     EXPECT_EQ(Captured().back(), Info("EXIT", "OK"));
   }
+}
+
+TEST_F(RecorderTest, RecordTooLargeIsRefusedBeforeAnythingIsWritten) {
+  ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
+  Captured().clear();
+  EXPECT_EQ(oAnalyticsSpecial("g1", "u1", std::string(std::size_t{32} << 20, 'x').c_str()), -1);
+  EXPECT_EQ(Captured(), (std::vector<Message>{Err("SPECIAL", "failed. Record too large.")}));
+  EXPECT_EQ(Records("g1"), std::vector<std::string>{Rec("INIT")});
 }
 
 TEST_F(RecorderTest, StorageThatCannotBeCreated) {

@@ -14,8 +14,11 @@ std::string Rec(const std::string &type, const std::string &game, const std::str
 }
 Message M(int level, const std::string &text) { return {level, "[OrvaneSDK] " + text}; }
 
+// The EXIT comes from an exit handler that the game registered before it
+// loaded the library: process-wide state must still be there.
 TEST_F(HostSessionTest, WorkedExampleOnANewMachine) {
-  HostRun run = Run({"enter", "g1", "u1", "init", "g1", "u1", "special", "g1", "u1", "score=10"});
+  HostRun run = Run({"enter", "g1", "u1", "init", "g1", "u1", "special", "g1", "u1", "score=10", "exit-at-exit",
+                     "g1", "u1"});
   EXPECT_EQ(run.exit_code, 0) << run.output;
   const std::vector<Message> expected = {
       M(0, "Logging initiated."),
@@ -26,12 +29,14 @@ TEST_F(HostSessionTest, WorkedExampleOnANewMachine) {
       M(0, "Analytics ENTER - OK"),
       M(1, "Analytics INIT - log had been already initialized."),
       M(0, "Analytics SPECIAL - OK"),
+      M(0, "Analytics EXIT - OK"),
   };
   EXPECT_EQ(run.messages, expected) << run.output;
   EXPECT_EQ(Records("g1", "g1"),
-            (std::vector<std::string>{Rec("INIT", "g1"), Rec("ENTER", "g1"), Rec("SPECIAL", "g1", "u1", "score=10")}));
+            (std::vector<std::string>{Rec("INIT", "g1"), Rec("ENTER", "g1"), Rec("SPECIAL", "g1", "u1", "score=10"),
+                                      Rec("EXIT", "g1")}));
   const std::string bytes = *ReadFile(LogPath("g1"));
-  EXPECT_EQ(std::count(bytes.begin(), bytes.end(), '\n'), 2);
+  EXPECT_EQ(std::count(bytes.begin(), bytes.end(), '\n'), 3);
   EXPECT_EQ(bytes.find('\r'), std::string::npos);
   EXPECT_NE(bytes.back(), '\n');
   EXPECT_TRUE(IsDirectory(data_ + "/Orvane/Logs"));

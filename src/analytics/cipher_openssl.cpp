@@ -2,6 +2,7 @@
 #include "analytics/cipher.h"
 
 #include <openssl/err.h>
+#include <openssl/crypto.h>
 #include <openssl/evp.h>
 
 #include <cstdio>
@@ -41,6 +42,10 @@ void CloseOpenSsl(Session *session) {
 }
 
 Session *OpenOpenSsl(const std::uint8_t *key, const std::uint8_t *iv) {
+  // OpenSSL's own exit-time clean-up would free its state while a game's exit
+  // handlers or other threads may still record; the process's end frees it.
+  static const bool initialised = OPENSSL_init_crypto(OPENSSL_INIT_NO_ATEXIT, nullptr) == 1;
+  (void)initialised;
   auto *session = new Session;
   std::memcpy(session->iv, iv, kIvSize);
   std::memcpy(session->chain, iv, kIvSize);

@@ -7,7 +7,7 @@
 #include "platform/platform.h"
 #include "sdk/storage.h"
 
-#include <mutex>
+#include <atomic>
 #include <string>
 #include <string_view>
 
@@ -23,7 +23,9 @@ namespace orvane {
         "[OrvaneSDK] Analytics " TYPE " - log had been already initialized.",                 \
         "[OrvaneSDK] Analytics " TYPE " - log was never initialized. Initialized the game log", \
         "[OrvaneSDK] Analytics " TYPE " - log file failed to write.",                         \
+        "[OrvaneSDK] Analytics " TYPE " - log file is locked by another process.",            \
         "[OrvaneSDK] Analytics " TYPE " - failed. Record encryption failed.",                 \
+        "[OrvaneSDK] Analytics " TYPE " - failed. Record too large.",                         \
         "[OrvaneSDK] Analytics " TYPE " - failed. Internal error."                            \
   }
 
@@ -36,18 +38,91 @@ const EventType kSpecialEvent = ORVANE_EVENT_TYPE("SPECIAL", true);
 
 namespace {
 
-// One recording at a time in the process. The buffers live on across events
-// so that an event allocates nothing once they have grown; they are never in
-// use while a nested INIT run uses them, since that run ends before the outer
-// run composes its own line.
-struct Recorder {
-  std::mutex lock;
+// A line that one write takes whole on every platform (Linux writes at most
+// 0x7ffff000 bytes at once), with room to spare for the INIT line that may
+// go in the same write.
+constexpr std::size_t kMaxLineBytes = std::size_t{64} << 20;
+// Buffers that one large event grew past this are given back when its call
+// ends, so that it does not keep the memory for good.
+constexpr std::size_t kKeptBufferBytes = std::size_t{1} << 20;
+// How long the first event of a log waits for another writer's lock.
+constexpr std::int64_t kLockWaitMilliseconds = 1000;
+constexpr int kLockPauseMilliseconds = 5;
+
+// What one recording works in besides its arguments. Each call takes one of
+// its own, so that threads never wait for each other: two recordings meet
+// only in the file system, where O_APPEND keeps lines whole and the file
+// lock keeps one INIT line per log, between threads as between processes.
+struct Workspace {
   std::string path;
   std::string record;
-  std::string line;
+  std::string line;      // the event's line, after a line break unless INIT
+  std::string init_line; // the INIT line that a first event writes before it
   TimestampCache clock;
+  RecordCipher cipher;
 };
-Recorder g_recorder;
+
+// Idle workspaces, so that ordinary events allocate nothing. A slot holds a
+// workspace or null; exchanging it hands the workspace over, so no lock is
+// needed. More threads recording at once than there are slots get a
+// workspace of their own for the call. Never destroyed: calls may come from
+// the game's exit handlers.
+constexpr std::size_t kIdleSlots = 16;
+std::atomic<Workspace *> g_idle[kIdleSlots];
+
+void Trim(std::string &buffer) {
+  if (buffer.capacity() > kKeptBufferBytes) std::string().swap(buffer);
+}
+
+struct WorkspaceLease {
+  Workspace *space = nullptr;
+
+  WorkspaceLease() {
+    for (std::atomic<Workspace *> &slot : g_idle)
+      if (slot.load(std::memory_order_relaxed) != nullptr &&
+          (space = slot.exchange(nullptr, std::memory_order_acquire)) != nullptr)
+        return;
+    space = new Workspace;
+  }
+  ~WorkspaceLease() {
+    Trim(space->record);
+    Trim(space->line);
+    Trim(space->init_line);
+    if (space->cipher.ciphertext.capacity() > kKeptBufferBytes)
+      std::vector<std::uint8_t>().swap(space->cipher.ciphertext);
+    for (std::atomic<Workspace *> &slot : g_idle) {
+      Workspace *empty = nullptr;
+      if (slot.compare_exchange_strong(empty, space, std::memory_order_release)) return;
+    }
+    delete space;
+  }
+  WorkspaceLease(const WorkspaceLease &) = delete;
+  WorkspaceLease &operator=(const WorkspaceLease &) = delete;
+};
+
+// An open log and the lock on it, given back on every path out of a call,
+// an exception included: a leaked handle would keep the lock held.
+struct LogFile {
+  platform::FileHandle handle = platform::kNoFile;
+  std::int64_t size = -1;
+  bool locked = false;
+
+  LogFile() = default;
+  LogFile(const LogFile &) = delete;
+  LogFile &operator=(const LogFile &) = delete;
+  ~LogFile() {
+    if (handle != platform::kNoFile) Close();
+  }
+  // True when everything written reached the file.
+  bool Close() {
+    const platform::Calls &os = platform::calls();
+    if (locked) os.unlock_file(handle);
+    locked = false;
+    const bool closed = os.close_file(handle);
+    handle = platform::kNoFile;
+    return closed;
+  }
+};
 
 std::string_view Text(const char *text) { return text ? std::string_view(text) : std::string_view(); }
 
@@ -58,86 +133,152 @@ struct Event {
   std::string_view extra;
 };
 
+// The game id as a message may show it: control bytes would let a hostile id
+// forge lines in the host's own log, so they appear as \xNN.
+void AppendPrintable(std::string &out, std::string_view text) {
+  static constexpr char kHex[] = "0123456789abcdef";
+  for (const char c : text) {
+    const auto byte = static_cast<unsigned char>(c);
+    if (byte >= 0x20 && byte != 0x7f) {
+      out += c;
+    } else {
+      out += "\\x";
+      out += kHex[byte >> 4];
+      out += kHex[byte & 0x0f];
+    }
+  }
+}
+
 // Opens the game's log. The directory is examined only when the open fails,
 // which spares the common event a system call and sends the host the same
 // messages in the same order as examining it first.
-platform::FileHandle OpenLog(MessageBatch &messages, const Event &event, const std::string &path) {
+void OpenLog(MessageBatch &messages, const Event &event, const std::string &path, LogFile &log) {
   const platform::Calls &os = platform::calls();
   const std::string &logs = Storage().logs;
   const bool usable = IsUsableGameId(event.game_id) && !logs.empty();
-  platform::FileHandle file = usable ? os.open_append(path.c_str()) : platform::kNoFile;
-  if (file == platform::kNoFile) {
-    if (!DirectoryExists(logs.c_str())) {
-      messages.Add(LogLevel::Info, event.type.sdk_not_initialized);
-      InitializeStorage(messages);
-      if (usable) file = os.open_append(path.c_str());
-    }
-    if (file == platform::kNoFile) {
-      std::string text = event.type.open_failed;
-      text += event.game_id;
-      text += ")?";
-      messages.AddOwned(LogLevel::Error, std::move(text));
-    }
+  if (usable) log.handle = os.open_log(path.c_str(), log.size);
+  if (log.handle != platform::kNoFile) return;
+  if (!DirectoryExists(logs.c_str())) {
+    messages.Add(LogLevel::Info, event.type.sdk_not_initialized);
+    InitializeStorage(messages);
   }
-  return file;
+  // Whoever made the directory (this call, or another process starting at the
+  // same moment), the open is worth one more try once it is there.
+  if (usable && DirectoryExists(logs.c_str())) log.handle = os.open_log(path.c_str(), log.size);
+  if (log.handle == platform::kNoFile) {
+    std::string text = event.type.open_failed;
+    AppendPrintable(text, event.game_id);
+    text += ")?";
+    messages.AddOwned(LogLevel::Error, std::move(text));
+  }
 }
 
-// The body of a recording, with the recorder lock held. `nested` marks the
-// INIT run that a first event makes while its own handle is open.
-std::int32_t RecordLocked(MessageBatch &messages, const Event &event, const std::string &path,
-                          bool nested) {
+// Waits for the log's lock until a deadline on the steady clock: a count of
+// pauses would not bound the time, since signals cut pauses short and
+// Windows stretches them to its timer tick.
+bool LockWithinDeadline(LogFile &log) {
+  const platform::Calls &os = platform::calls();
+  const std::int64_t deadline = os.steady_milliseconds() + kLockWaitMilliseconds;
+  for (;;) {
+    switch (os.try_lock_file(log.handle)) {
+    case platform::LockResult::kLocked: return log.locked = true;
+    case platform::LockResult::kFailed: return false;
+    case platform::LockResult::kBusy: break;
+    }
+    if (os.steady_milliseconds() >= deadline) return false;
+    os.sleep_milliseconds(kLockPauseMilliseconds);
+  }
+}
+
+enum class Encoded { kLine, kTooLarge, kCipherFailed };
+
+// Appends the encrypted line of one record of `type` to `out`.
+Encoded EncodeLine(Workspace &space, const Event &event, const EventType &type, std::string_view time,
+                   std::string &out) {
+  const std::string_view extra = type.carries_extra ? event.extra : std::string_view();
+  // The record is at least its unescaped values and the fixed text; a record
+  // too large even so is refused before it is composed.
+  const std::size_t least = kRecordFixedBytes + event.user_id.size() + event.game_id.size() +
+                            std::string_view(type.name).size() + time.size() + extra.size();
+  if (least > kMaxLineBytes / 2) return Encoded::kTooLarge;
+  space.record.clear();
+  AppendEventRecord(space.record, event.game_id, event.user_id, type.name, time, extra);
+  if (2 * cipher::CiphertextSize(space.record.size()) > kMaxLineBytes) return Encoded::kTooLarge;
+  if (!EncryptRecordText(space.cipher, space.record, out)) return Encoded::kCipherFailed;
+  return Encoded::kLine;
+}
+
+const char *EncodeFailure(const EventType &type, Encoded failure) {
+  return failure == Encoded::kTooLarge ? type.too_large : type.encryption_failed;
+}
+
+std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event) {
   const platform::Calls &os = platform::calls();
   const EventType &type = event.type;
-  const platform::FileHandle file = OpenLog(messages, event, path);
-  if (file == platform::kNoFile) return -1;
-
-  // An empty log is the one moment two processes could both write an INIT
-  // line, so only then is the file locked and measured again. The nested run
-  // needs no lock: its outer run holds it.
-  std::int64_t size = os.file_size(file);
-  bool locked = false;
-  if (size == 0 && !nested) {
-    locked = os.lock_file(file);
-    if (locked) size = os.file_size(file);
-  }
-  auto finish = [&](bool wrote_ok) {
-    if (locked) os.unlock_file(file);
-    return os.close_file(file) && wrote_ok;
-  };
-
-  Recorder &r = g_recorder;
-  r.line.clear();
-  if (&type == &kInitEvent) {
-    if (size != 0) {
-      messages.Add(LogLevel::Warning, type.already_initialized);
-      finish(true);
-      return 0;
-    }
-  } else {
-    if (size == 0) {
-      messages.Add(LogLevel::Warning, type.log_not_initialized);
-      // Its outcome is its own: a failed INIT line is reported by the nested
-      // run, and this event is still written.
-      RecordLocked(messages, Event{event.game_id, event.user_id, kInitEvent, {}}, path, true);
-    }
-    r.line = platform::line_break();
+  const bool is_init = &type == &kInitEvent;
+  LogFile log;
+  OpenLog(messages, event, space.path, log);
+  if (log.handle == platform::kNoFile) return -1;
+  if (is_init && log.size != 0) {
+    messages.Add(LogLevel::Warning, type.already_initialized);
+    return 0;
   }
 
-  r.record.clear();
-  AppendEventRecord(r.record, event.game_id, event.user_id, type.name, r.clock.Now(),
-                    type.carries_extra ? event.extra : std::string_view());
-  if (!EncryptRecordText(r.record, r.line)) {
-    messages.Add(LogLevel::Error, type.encryption_failed);
-    finish(true);
+  // The line is ready before the lock is taken: the lock then covers only
+  // measuring the file again and writing, however slow the cipher is.
+  const std::string_view time = space.clock.Now();
+  space.line.clear();
+  if (!is_init) space.line = platform::line_break();
+  if (const Encoded encoded = EncodeLine(space, event, type, time, space.line); encoded != Encoded::kLine) {
+    messages.Add(LogLevel::Error, EncodeFailure(type, encoded));
     return -1;
   }
-  // The line break and the line go in one write, so that a concurrent writer
-  // can never land between them.
-  const bool appended = os.append(file, r.line.data(), r.line.size());
-  if (!finish(appended)) {
+
+  // An empty log is the one moment two writers could both start it, so only
+  // then is the file locked; its size is taken again whatever the wait gave,
+  // since another writer may have started it meanwhile.
+  if (log.size == 0) {
+    const bool locked = LockWithinDeadline(log);
+    log.size = os.file_size(log.handle);
+    if (log.size == 0 && !locked) {
+      messages.Add(LogLevel::Error, type.locked_out);
+      return -1;
+    }
+    if (is_init && log.size != 0) {
+      messages.Add(LogLevel::Warning, type.already_initialized);
+      return 0;
+    }
+  }
+
+  // Only a call that holds the lock and has just found the log empty writes
+  // without a line break in front; a first event writes the INIT line and its
+  // own in one write, so that no log ever starts with anything else.
+  const bool starts_log = log.size == 0;
+  std::string_view bytes = space.line;
+  if (starts_log && !is_init) {
+    messages.Add(LogLevel::Warning, type.log_not_initialized);
+    space.init_line.clear();
+    if (const Encoded encoded = EncodeLine(space, event, kInitEvent, time, space.init_line);
+        encoded != Encoded::kLine) {
+      messages.Add(LogLevel::Error, EncodeFailure(kInitEvent, encoded));
+      messages.Add(LogLevel::Error, EncodeFailure(type, encoded));
+      return -1;
+    }
+    space.init_line += space.line;
+    bytes = space.init_line;
+  }
+  bool written = os.append(log.handle, bytes.data(), bytes.size());
+  // A torn first line would leave the log without a readable INIT line for
+  // good; it is cut away while the lock still keeps other writers out. Later
+  // lines are never cut: without the lock that could cut another's line.
+  if (!written && starts_log) os.truncate_file(log.handle, 0);
+  written = log.Close() && written;
+  if (!written) {
+    if (starts_log && !is_init) messages.Add(LogLevel::Error, kInitEvent.write_failed);
     messages.Add(LogLevel::Error, type.write_failed);
     return -1;
   }
+  if (starts_log && !is_init) messages.Add(LogLevel::Info, kInitEvent.ok);
   messages.Add(LogLevel::Info, type.ok);
   return 0;
 }
@@ -157,12 +298,12 @@ std::int32_t RecordEvent(MessageBatch &messages, const char *game_id, const char
     messages.Add(LogLevel::Error, type.user_id_empty);
     return -1;
   }
-  std::lock_guard<std::mutex> hold(g_recorder.lock);
-  std::string &path = g_recorder.path;
-  path = Storage().logs;
-  path += event.game_id;
-  path += ".log";
-  return RecordLocked(messages, event, path, false);
+  const WorkspaceLease lease;
+  Workspace &space = *lease.space;
+  space.path = Storage().logs;
+  space.path += event.game_id;
+  space.path += ".log";
+  return Record(messages, space, event);
 }
 
 } // namespace orvane

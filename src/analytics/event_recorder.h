@@ -21,7 +21,9 @@ struct EventType {
   const char *already_initialized;
   const char *log_not_initialized;
   const char *write_failed;
+  const char *locked_out; // the log was empty and another writer held it
   const char *encryption_failed;
+  const char *too_large;
   const char *internal_error;
 };
 
@@ -33,7 +35,8 @@ extern const EventType kSpecialEvent;
 // Records one event and adds its messages to `messages`. Returns 0 when the
 // line is in the file (or an INIT found the log already started), -1 when the
 // call was refused or the line could not be written. A null text counts as
-// empty. Safe to call from several threads: one recording runs at a time.
+// empty. Safe to call from several threads at once: recordings share no
+// lock, and every line lands whole.
 std::int32_t RecordEvent(MessageBatch &messages, const char *game_id, const char *user_id,
                          const EventType &type, const char *extra);
 

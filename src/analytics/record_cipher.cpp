@@ -1,12 +1,8 @@
 #include "analytics/record_cipher.h"
 
-#include "analytics/cipher.h"
-#include "analytics/record_text.h"
-
 #include <atomic>
 #include <cstring>
 #include <mutex>
-#include <vector>
 
 #if defined(__SSE2__) || defined(_M_X64)
 #include <emmintrin.h>
@@ -18,16 +14,6 @@ namespace {
 KeyBlock g_key_block;
 std::once_flag g_key_taken;
 std::atomic<bool> g_key_ready{false};
-
-// The cipher session for the key block as it stands, and the ciphertext
-// buffer, reused from record to record.
-struct CipherCache {
-  std::mutex lock;
-  cipher::Session *session = nullptr;
-  const void *prepared_for = nullptr; // keyTextTaken when the session was made
-  std::vector<std::uint8_t> ciphertext;
-};
-CipherCache g_cache;
 
 constexpr char HexDigit(std::uint8_t nibble) {
   return static_cast<char>(nibble + (nibble > 9 ? 'a' - 10 : '0'));
@@ -66,11 +52,14 @@ void TakeKeyText(const char *game_id) {
   // Every event passes here; after the first, one load decides.
   if (g_key_ready.load(std::memory_order_acquire)) return;
   std::call_once(g_key_taken, [game_id] {
-    std::lock_guard<std::mutex> hold(g_cache.lock);
     g_key_block.keyText = MakeKeyText(game_id ? std::string_view(game_id) : std::string_view());
     g_key_block.keyTextTaken = &g_key_block;
     g_key_ready.store(true, std::memory_order_release);
   });
+}
+
+RecordCipher::~RecordCipher() {
+  if (session != nullptr) cipher::backend().close(session);
 }
 
 void AppendHex(std::string &out, const std::uint8_t *bytes, std::size_t size) {
@@ -86,33 +75,27 @@ void AppendHex(std::string &out, const std::uint8_t *bytes, std::size_t size) {
   }
 }
 
-bool EncryptRecordText(std::string_view record, std::string &hex) {
+bool EncryptRecordText(RecordCipher &state, std::string_view record, std::string &hex) {
   const cipher::Backend &backend = cipher::backend();
-  std::lock_guard<std::mutex> hold(g_cache.lock);
   // Key and IV follow the key block: an encryption before the first event
   // uses the all-zero key text, and the session is made again once it fills.
-  if (g_cache.session == nullptr || g_cache.prepared_for != g_key_block.keyTextTaken) {
-    if (g_cache.session != nullptr) backend.close(g_cache.session);
-    g_cache.session = backend.open(g_key_block.keyText.data() + kKeyOffset,
-                                   g_key_block.keyText.data() + kIvOffset);
-    g_cache.prepared_for = g_key_block.keyTextTaken;
-    if (g_cache.session == nullptr) return false;
+  // The block is read only after TakeKeyText published it (or before any
+  // event, when it is all zero and stays so until then).
+  const void *taken = g_key_ready.load(std::memory_order_acquire) ? g_key_block.keyTextTaken : nullptr;
+  if (state.session == nullptr || state.prepared_for != taken) {
+    if (state.session != nullptr) backend.close(state.session);
+    state.session = backend.open(g_key_block.keyText.data() + kKeyOffset,
+                                 g_key_block.keyText.data() + kIvOffset);
+    state.prepared_for = taken;
+    if (state.session == nullptr) return false;
   }
-  g_cache.ciphertext.resize(cipher::CiphertextSize(record.size()));
+  state.ciphertext.resize(cipher::CiphertextSize(record.size()));
   const std::ptrdiff_t size =
-      backend.encrypt(g_cache.session, reinterpret_cast<const std::uint8_t *>(record.data()),
-                      record.size(), g_cache.ciphertext.data());
+      backend.encrypt(state.session, reinterpret_cast<const std::uint8_t *>(record.data()),
+                      record.size(), state.ciphertext.data());
   if (size < 0) return false;
-  AppendHex(hex, g_cache.ciphertext.data(), static_cast<std::size_t>(size));
+  AppendHex(hex, state.ciphertext.data(), static_cast<std::size_t>(size));
   return true;
 }
-
-std::string EncodeEventRecord(std::string_view game_id, std::string_view user_id,
-                              std::string_view type, std::string_view extra) {
-  std::string hex;
-  if (!EncryptRecordText(ComposeEventRecord(game_id, user_id, type, extra), hex)) hex.clear();
-  return hex;
-}
-
 
 } // namespace orvane

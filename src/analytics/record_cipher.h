@@ -2,10 +2,12 @@
 // AES-256-CBC ciphertext under the process's key block.
 #pragma once
 
+#include "analytics/cipher.h"
 #include "analytics/key_text.h"
 
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace orvane {
 
@@ -24,18 +26,25 @@ const KeyBlock &GetKeyBlock();
 // from several threads.
 void TakeKeyText(const char *game_id);
 
+// One caller's cipher state: a backend session for the key block as it stood
+// when the session was made, and the ciphertext buffer, both reused from
+// record to record. Never shared between threads at the same time.
+struct RecordCipher {
+  cipher::Session *session = nullptr;
+  const void *prepared_for = nullptr; // keyTextTaken when the session was made
+  std::vector<std::uint8_t> ciphertext;
+
+  RecordCipher() = default;
+  RecordCipher(const RecordCipher &) = delete;
+  RecordCipher &operator=(const RecordCipher &) = delete;
+  ~RecordCipher();
+};
+
 // Appends the hex text of the encrypted `record` to `hex`. False when the
 // cipher failed: the reason went to standard error and `hex` is unchanged.
-// Safe to call from several threads.
-bool EncryptRecordText(std::string_view record, std::string &hex);
+bool EncryptRecordText(RecordCipher &state, std::string_view record, std::string &hex);
 
 // Appends two lowercase hex digits per byte.
 void AppendHex(std::string &out, const std::uint8_t *bytes, std::size_t size);
-
-// The hex line of one event stamped now; an empty text when the cipher failed.
-// The event path composes into its own buffers instead; this serves callers
-// that want one line.
-std::string EncodeEventRecord(std::string_view game_id, std::string_view user_id,
-                              std::string_view type, std::string_view extra);
 
 } // namespace orvane

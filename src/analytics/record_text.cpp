@@ -60,6 +60,9 @@ constexpr std::string_view kMemberPrefix[5] = {"{\"user_id\":\"", "\",\"game_id\
                                                "\",\"type\":\"", "\",\"time\":\"",
                                                "\",\"extra\":\""};
 constexpr std::string_view kRecordEnd = "\"}";
+static_assert(kMemberPrefix[0].size() + kMemberPrefix[1].size() + kMemberPrefix[2].size() +
+                  kMemberPrefix[3].size() + kMemberPrefix[4].size() + kRecordEnd.size() ==
+              kRecordFixedBytes);
 
 char *Put(char *p, std::string_view text) {
   if (!text.empty()) std::memcpy(p, text.data(), text.size()); // an empty view may hold null

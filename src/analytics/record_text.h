@@ -3,10 +3,14 @@
 // white space and no line end.
 #pragma once
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
 namespace orvane {
+
+// Bytes of a record that are not values: member names, quotes, separators.
+inline constexpr std::size_t kRecordFixedBytes = 58;
 
 // Appends `value` as the inside of a JSON string: `"` and `\` are escaped and
 // bytes below 0x20 take their JSON escape; every other byte stands as it came.

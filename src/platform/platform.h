@@ -2,8 +2,10 @@
 //
 // Each platform (posix/, windows/) fills the table with its own
 // implementation; the logic above calls only through it and never asks which
-// platform it runs on. Tests replace single entries to inject failures, the
-// way SQLite swaps its system calls.
+// platform it runs on. Policy (how long to wait for a lock, when to retry, how
+// large a line may be) is decided above the table, once; the entries only do.
+// Tests replace single entries to inject failures, the way SQLite swaps its
+// system calls.
 #pragma once
 
 #include <cstddef>
@@ -22,31 +24,41 @@ inline constexpr FileHandle kNoFile = -1;
 // 16-bit units.
 using ArgumentList = std::vector<std::u16string>;
 
+enum class LockResult { kLocked, kBusy, kFailed };
+
 struct Calls {
   // True exactly when `path` names an existing directory, with or without a
   // trailing separator.
   bool (*directory_exists)(const char *path);
-  // Creates one directory level with default permissions.
+  // Creates one directory level, for this user only where the platform has
+  // per-file permissions.
   bool (*make_directory)(const char *path);
   // Creates `path` and its missing parents, readable by the owner only.
   bool (*make_private_directories)(const char *path);
 
-  // Opens `path` for appending, creating it when missing, with no sharing
-  // restriction toward other handles or processes.
-  FileHandle (*open_append)(const char *path);
+  // Opens the regular file `path` for appending, creating it (owner-only)
+  // when missing, with no sharing restriction toward other handles or
+  // processes, and sets `size` to its size (-1 when it cannot be taken).
+  // Refuses, without blocking, anything that is not a regular file: a link
+  // at `path`, a FIFO, a device.
+  FileHandle (*open_log)(const char *path, std::int64_t &size);
   // Size of the open file in bytes, -1 when it cannot be taken.
   std::int64_t (*file_size)(FileHandle file);
   // One write at the current end of the file; true only when all bytes went.
   bool (*append)(FileHandle file, const void *data, std::size_t size);
+  // Cuts the file back to `size` bytes.
+  bool (*truncate_file)(FileHandle file, std::int64_t size);
   // True when everything buffered reached the file.
   bool (*close_file)(FileHandle file);
-  // Advisory lock between processes, waiting a bounded time. False means the
-  // lock could not be had and the caller goes on without it.
-  bool (*lock_file)(FileHandle file);
+  // Advisory lock between open files, also of one process; never waits.
+  LockResult (*try_lock_file)(FileHandle file);
   void (*unlock_file)(FileHandle file);
 
   // Whole seconds since 1970-01-01 00:00:00 UTC.
   std::int64_t (*now_seconds)();
+  // A clock that only moves forward, for deadlines.
+  std::int64_t (*steady_milliseconds)();
+  void (*sleep_milliseconds)(int milliseconds);
   // The process argument list, read afresh. False when it cannot be had.
   bool (*argument_list)(ArgumentList &args);
 };
@@ -62,9 +74,22 @@ struct StorageLocation {
   std::string root; // ends in the separator
   std::string logs; // directly inside root, ends in the separator
 };
+// Reads the environment (and on POSIX possibly the account database), so it
+// runs on first use, never at load.
 StorageLocation default_storage_location();
 
 // The bytes that separate two lines of a log file.
 std::string_view line_break();
+
+// Keeps the calling thread from being cancelled while it runs library code
+// (an unwinding cancellation cannot pass the library's noexcept frames), and
+// gives the caller's setting back afterwards.
+struct CancellationOff {
+  CancellationOff();
+  ~CancellationOff();
+  CancellationOff(const CancellationOff &) = delete;
+  CancellationOff &operator=(const CancellationOff &) = delete;
+  int previous;
+};
 
 } // namespace orvane::platform

@@ -2,6 +2,7 @@
 // every C++ exception inside the library, then deliver the messages.
 #pragma once
 
+#include "platform/platform.h"
 #include "sdk/log_channel.h"
 
 #include <utility>
@@ -13,6 +14,7 @@ namespace orvane {
 // returns `failure` instead: no exception ever reaches the host.
 template <class Result, class Work>
 Result RunExport(Result failure, const char *failure_message, Work &&work) noexcept {
+  const platform::CancellationOff uncancellable;
   MessageBatch messages;
   Result result = failure;
   try {

@@ -6,6 +6,7 @@
 extern "C" {
 
 ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback) {
+  const orvane::platform::CancellationOff uncancellable;
   orvane::RegisterForLogs(callback);
 }
 

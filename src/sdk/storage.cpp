@@ -1,16 +1,33 @@
 #include "sdk/storage.h"
 
+#include <atomic>
+
 namespace orvane {
 namespace {
 
-// Built when the library is loaded, from the environment of that moment.
-platform::StorageLocation g_storage = platform::default_storage_location();
+// Found on first use, not at load: finding it reads the environment and may
+// ask the account database, which a game's start must not wait for. Never
+// destroyed, so that calls from exit handlers and static destructors of the
+// game still see it.
+std::atomic<const platform::StorageLocation *> g_storage{nullptr};
 
 } // namespace
 
-const platform::StorageLocation &Storage() { return g_storage; }
+const platform::StorageLocation &Storage() {
+  if (const platform::StorageLocation *where = g_storage.load(std::memory_order_acquire)) return *where;
+  static const platform::StorageLocation *const found =
+      new platform::StorageLocation(platform::default_storage_location());
+  const platform::StorageLocation *expected = nullptr;
+  g_storage.compare_exchange_strong(expected, found, std::memory_order_acq_rel);
+  return *g_storage.load(std::memory_order_acquire);
+}
 
-void SetStorageForTesting(platform::StorageLocation where) { g_storage = std::move(where); }
+void SetStorageForTesting(platform::StorageLocation where) {
+  // One slot for every test; a test sets it while no call runs.
+  static platform::StorageLocation *const slot = new platform::StorageLocation;
+  *slot = std::move(where);
+  g_storage.store(slot, std::memory_order_release);
+}
 
 bool DirectoryExists(const char *path) {
   return path[0] != '\0' && platform::calls().directory_exists(path);

@@ -7,7 +7,7 @@
 
 namespace orvane {
 
-// The directories of this process, fixed when the library is loaded.
+// The directories of this process, found on first use and then fixed.
 const platform::StorageLocation &Storage();
 // Points the library at other directories; tests use it to stay out of the
 // real home directory.

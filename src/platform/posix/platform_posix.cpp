@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <ctime>
 #include <fcntl.h>
+#include <pthread.h>
 #include <pwd.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -19,7 +20,10 @@ bool DirectoryExistsPosix(const char *path) {
   return ::stat(path, &st) == 0 && S_ISDIR(st.st_mode);
 }
 
-bool MakeDirectoryPosix(const char *path) { return ::mkdir(path, 0777) == 0; }
+// Owner-only whatever the umask: another local user must not be able to
+// plant links or FIFOs where the logs go, or read logs whose key follows from
+// their names.
+bool MakeDirectoryPosix(const char *path) { return ::mkdir(path, 0700) == 0; }
 
 bool MakePrivateDirectoriesPosix(const char *path) {
   std::string partial(path);
@@ -33,12 +37,24 @@ bool MakePrivateDirectoriesPosix(const char *path) {
   return DirectoryExistsPosix(path);
 }
 
-FileHandle OpenAppendPosix(const char *path) {
+FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
+  // O_NOFOLLOW: a link at the log path would let the library write anywhere
+  // the game may. O_NONBLOCK: opening a FIFO must not hang the game.
   int fd;
   do {
-    fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0666);
+    fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600);
   } while (fd < 0 && errno == EINTR);
-  return fd < 0 ? kNoFile : fd;
+  if (fd < 0) return kNoFile;
+  struct stat st;
+  if (::fstat(fd, &st) != 0) {
+    size = -1;
+  } else if (!S_ISREG(st.st_mode)) {
+    ::close(fd);
+    return kNoFile;
+  } else {
+    size = st.st_size;
+  }
+  return fd;
 }
 
 std::int64_t FileSizePosix(FileHandle file) {
@@ -58,46 +74,65 @@ bool AppendPosix(FileHandle file, const void *data, std::size_t size) {
   return written >= 0 && static_cast<std::size_t>(written) == size;
 }
 
+bool TruncateFilePosix(FileHandle file, std::int64_t size) {
+  int result;
+  do {
+    result = ::ftruncate(static_cast<int>(file), static_cast<off_t>(size));
+  } while (result != 0 && errno == EINTR);
+  return result == 0;
+}
+
 bool CloseFilePosix(FileHandle file) {
   // On Linux the descriptor is released even when close reports EINTR, so it
   // is never retried.
   return ::close(static_cast<int>(file)) == 0;
 }
 
-bool LockFilePosix(FileHandle file) {
-  // flock, not fcntl: fcntl locks vanish when any descriptor of the file is
-  // closed in this process, which the nested INIT run does.
-  constexpr int kAttempts = 200; // 200 x 5 ms: one second at the most
-  for (int i = 0; i < kAttempts; ++i) {
-    if (::flock(static_cast<int>(file), LOCK_EX | LOCK_NB) == 0) return true;
-    if (errno != EWOULDBLOCK && errno != EINTR) return false;
-    struct timespec pause = {0, 5 * 1000 * 1000};
-    ::nanosleep(&pause, nullptr);
-  }
-  return false;
+LockResult TryLockFilePosix(FileHandle file) {
+  // flock, not fcntl: an flock belongs to the open file description, so two
+  // opens of one log in this process exclude each other as two processes do,
+  // and closing another descriptor of the file does not drop it.
+  if (::flock(static_cast<int>(file), LOCK_EX | LOCK_NB) == 0) return LockResult::kLocked;
+  return errno == EWOULDBLOCK || errno == EINTR ? LockResult::kBusy : LockResult::kFailed;
 }
 
 void UnlockFilePosix(FileHandle file) { ::flock(static_cast<int>(file), LOCK_UN); }
 
 std::int64_t NowSecondsPosix() { return static_cast<std::int64_t>(::time(nullptr)); }
 
+std::int64_t SteadyMillisecondsPosix() {
+  struct timespec now;
+  ::clock_gettime(CLOCK_MONOTONIC, &now);
+  return static_cast<std::int64_t>(now.tv_sec) * 1000 + now.tv_nsec / 1000000;
+}
+
+void SleepMillisecondsPosix(int milliseconds) {
+  // A signal may end the pause early; the caller's deadline decides.
+  struct timespec pause = {milliseconds / 1000, (milliseconds % 1000) * 1000000L};
+  ::nanosleep(&pause, nullptr);
+}
+
+// Closes a descriptor on every path out, an allocation failure included.
+struct Descriptor {
+  int fd;
+  ~Descriptor() {
+    if (fd >= 0) ::close(fd);
+  }
+};
+
 bool ArgumentListPosix(ArgumentList &args) {
   args.clear();
-  int fd = ::open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC);
-  if (fd < 0) return false;
+  const Descriptor cmdline{::open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC)};
+  if (cmdline.fd < 0) return false;
   std::string bytes;
   char chunk[4096];
   for (;;) {
-    ssize_t n = ::read(fd, chunk, sizeof chunk);
+    const ssize_t n = ::read(cmdline.fd, chunk, sizeof chunk);
     if (n < 0 && errno == EINTR) continue;
-    if (n < 0) {
-      ::close(fd);
-      return false;
-    }
+    if (n < 0) return false;
     if (n == 0) break;
     bytes.append(chunk, static_cast<std::size_t>(n));
   }
-  ::close(fd);
   // Every argument ends in a zero byte (the last may not); each byte becomes
   // one unit so that narrowing gives the argument's bytes back unchanged.
   args.reserve(static_cast<std::size_t>(std::count(bytes.begin(), bytes.end(), '\0')) + 1);
@@ -125,10 +160,11 @@ std::string HomeDirectory() {
 }
 
 const Calls kPosixCalls = {
-    DirectoryExistsPosix, MakeDirectoryPosix, MakePrivateDirectoriesPosix,
-    OpenAppendPosix,      FileSizePosix,      AppendPosix,
-    CloseFilePosix,       LockFilePosix,      UnlockFilePosix,
-    NowSecondsPosix,      ArgumentListPosix,
+    DirectoryExistsPosix,    MakeDirectoryPosix,     MakePrivateDirectoriesPosix,
+    OpenLogPosix,            FileSizePosix,          AppendPosix,
+    TruncateFilePosix,       CloseFilePosix,         TryLockFilePosix,
+    UnlockFilePosix,         NowSecondsPosix,        SteadyMillisecondsPosix,
+    SleepMillisecondsPosix,  ArgumentListPosix,
 };
 
 Calls g_calls = kPosixCalls;
@@ -156,5 +192,8 @@ StorageLocation default_storage_location() {
 }
 
 std::string_view line_break() { return "\n"; }
+
+CancellationOff::CancellationOff() { ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &previous); }
+CancellationOff::~CancellationOff() { ::pthread_setcancelstate(previous, nullptr); }
 
 } // namespace orvane::platform

@@ -46,18 +46,34 @@ bool MakePrivateDirectoriesWindows(const char *path) {
   return DirectoryExistsWindows(path);
 }
 
-FileHandle OpenAppendWindows(const char *path) {
+FileHandle OpenLogWindows(const char *path, std::int64_t &size) {
   // Append data without write data: the system places every WriteFile at the
   // end of the file at that moment, so lines of concurrent writers never
   // overwrite each other. Read data is there for the byte-range lock, read
   // attributes for the size. Every sharing mode is allowed, so that other
-  // handles and processes (the nested INIT run, a second game, a reader) may
-  // open the file meanwhile.
+  // handles and processes (a second game, a reader) may open the file
+  // meanwhile. A reparse point (a link) at the path is opened as itself, not
+  // followed, and then refused below; the folders keep their default access
+  // rules, since several users of one machine share C:\Orvane\.
   const HANDLE file = ::CreateFileA(
       path, FILE_READ_DATA | FILE_APPEND_DATA | FILE_READ_ATTRIBUTES | SYNCHRONIZE,
       FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_ALWAYS,
-      FILE_ATTRIBUTE_NORMAL, nullptr);
+      FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
   if (file == INVALID_HANDLE_VALUE) return kNoFile;
+  BY_HANDLE_FILE_INFORMATION info;
+  if (::GetFileType(file) != FILE_TYPE_DISK) {
+    ::CloseHandle(file);
+    return kNoFile;
+  }
+  if (!::GetFileInformationByHandle(file, &info)) {
+    size = -1;
+  } else if ((info.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0) {
+    ::CloseHandle(file);
+    return kNoFile;
+  } else {
+    size = static_cast<std::int64_t>((static_cast<std::uint64_t>(info.nFileSizeHigh) << 32) |
+                                     info.nFileSizeLow);
+  }
   return reinterpret_cast<FileHandle>(file);
 }
 
@@ -76,6 +92,19 @@ bool AppendWindows(FileHandle file, const void *data, std::size_t size) {
          written == size;
 }
 
+bool TruncateFileWindows(FileHandle file, std::int64_t size) {
+  // The log handle may only append; cutting back needs write access, which a
+  // second handle to the same file gets without opening the path again.
+  const HANDLE writer = ::ReOpenFile(AsHandle(file), GENERIC_WRITE,
+                                     FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, 0);
+  if (writer == INVALID_HANDLE_VALUE) return false;
+  LARGE_INTEGER at;
+  at.QuadPart = size;
+  const bool cut = ::SetFilePointerEx(writer, at, nullptr, FILE_BEGIN) && ::SetEndOfFile(writer);
+  ::CloseHandle(writer);
+  return cut;
+}
+
 bool CloseFileWindows(FileHandle file) { return ::CloseHandle(AsHandle(file)) != 0; }
 
 // Byte-range locks on Windows are mandatory: a write into a locked range
@@ -90,17 +119,14 @@ OVERLAPPED LockRange() {
   return where;
 }
 
-bool LockFileWindows(FileHandle file) {
-  constexpr int kAttempts = 200; // 200 x 5 ms: one second at the most
-  for (int i = 0; i < kAttempts; ++i) {
-    OVERLAPPED where = LockRange();
-    if (::LockFileEx(AsHandle(file), LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0,
-                     &where))
-      return true;
-    if (::GetLastError() != ERROR_LOCK_VIOLATION) return false;
-    ::Sleep(5);
-  }
-  return false;
+LockResult TryLockFileWindows(FileHandle file) {
+  // A lock belongs to its handle, so two handles of one process exclude each
+  // other as two processes do.
+  OVERLAPPED where = LockRange();
+  if (::LockFileEx(AsHandle(file), LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0,
+                   &where))
+    return LockResult::kLocked;
+  return ::GetLastError() == ERROR_LOCK_VIOLATION ? LockResult::kBusy : LockResult::kFailed;
 }
 
 void UnlockFileWindows(FileHandle file) {
@@ -109,6 +135,12 @@ void UnlockFileWindows(FileHandle file) {
 }
 
 std::int64_t NowSecondsWindows() { return static_cast<std::int64_t>(::_time64(nullptr)); }
+
+std::int64_t SteadyMillisecondsWindows() { return static_cast<std::int64_t>(::GetTickCount64()); }
+
+// Sleep rounds up to the timer tick (about 15.6 ms); the caller's deadline,
+// not the number of pauses, bounds a wait.
+void SleepMillisecondsWindows(int milliseconds) { ::Sleep(static_cast<DWORD>(milliseconds)); }
 
 // Releases the list of CommandLineToArgvW, once, also when a copy throws.
 struct ArgvRelease {
@@ -134,10 +166,11 @@ bool ArgumentListWindows(ArgumentList &args) {
 }
 
 const Calls kWindowsCalls = {
-    DirectoryExistsWindows, MakeDirectoryWindows, MakePrivateDirectoriesWindows,
-    OpenAppendWindows,      FileSizeWindows,      AppendWindows,
-    CloseFileWindows,       LockFileWindows,      UnlockFileWindows,
-    NowSecondsWindows,      ArgumentListWindows,
+    DirectoryExistsWindows,   MakeDirectoryWindows,      MakePrivateDirectoriesWindows,
+    OpenLogWindows,           FileSizeWindows,           AppendWindows,
+    TruncateFileWindows,      CloseFileWindows,          TryLockFileWindows,
+    UnlockFileWindows,        NowSecondsWindows,         SteadyMillisecondsWindows,
+    SleepMillisecondsWindows, ArgumentListWindows,
 };
 
 Calls g_calls = kWindowsCalls;
@@ -156,5 +189,9 @@ StorageLocation default_storage_location() {
 }
 
 std::string_view line_break() { return "\r\n"; }
+
+// Windows threads are not cancelled from outside the way POSIX threads are.
+CancellationOff::CancellationOff() : previous(0) {}
+CancellationOff::~CancellationOff() = default;
 
 } // namespace orvane::platform

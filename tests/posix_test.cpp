@@ -1,0 +1,140 @@
+// What only POSIX systems have: file modes, links, FIFOs, a real full disk,
+// thread cancellation, and where the files go.
+#include "OrvaneSDK.h"
+#include "sdk/storage.h"
+#include "support/test_support.h"
+
+#include <atomic>
+#include <csignal>
+#include <cstdlib>
+#include <filesystem>
+#include <pthread.h>
+#include <string>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace orvane::testing {
+namespace {
+
+class PosixTest : public SandboxTest {};
+
+mode_t ModeOf(const std::string &path) {
+  struct stat st;
+  return ::stat(path.c_str(), &st) == 0 ? st.st_mode & 07777 : 0;
+}
+
+// Owner-only whatever the umask: no other user may plant links or FIFOs
+// where the logs go, or read logs whose key follows from their names.
+TEST_F(PosixTest, StorageAndLogsAreOwnerOnly) {
+  const mode_t saved = ::umask(0);
+  const int result = oAnalyticsGameEnter("g1", "u1");
+  ::umask(saved);
+  ASSERT_EQ(result, 0);
+  for (const std::string &dir : {where_.base, where_.root, where_.logs}) EXPECT_EQ(ModeOf(dir), 0700u) << dir;
+  EXPECT_EQ(ModeOf(LogPath("g1")), 0600u);
+}
+
+// Anything but a regular file at a log path is refused at once: a FIFO would
+// hang the game, a link would let it write anywhere the game may.
+TEST_F(PosixTest, OnlyARegularFileIsALog) {
+  std::filesystem::create_directories(where_.logs);
+  const std::string outside = base_ + "/outside";
+  WriteFile(outside, "kept");
+  ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600), 0);
+  std::filesystem::create_symlink(outside, LogPath("link"));
+  std::filesystem::create_symlink(base_ + "/planted", LogPath("dangling"));
+  for (const char *game : {"fifo", "link", "dangling"}) {
+    SCOPED_TRACE(game);
+    Captured().clear();
+    EXPECT_EQ(oAnalyticsGameEnter(game, "u1"), -1);
+    EXPECT_EQ(Captured(), (std::vector<Message>{{2, std::string("[OrvaneSDK] Analytics ENTER - log file failed "
+                                                                "to open. Maybe a bad game_id (") + game + ")?"}}));
+  }
+  EXPECT_EQ(ReadFile(outside), "kept");
+  EXPECT_FALSE(Exists(base_ + "/planted"));
+}
+
+TEST_F(PosixTest, ALineThatDoesNotFitIsAnErrorNotOk) {
+  std::filesystem::create_directories(where_.logs);
+  ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
+  const std::string before = *ReadFile(LogPath("g1"));
+
+  rlimit saved;
+  ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
+  auto previous = std::signal(SIGXFSZ, SIG_IGN);
+  rlimit full = saved;
+  full.rlim_cur = before.size(); // not one byte more fits
+  ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &full), 0);
+  Captured().clear();
+  const int result = oAnalyticsGameEnter("g1", "u1");
+  ::setrlimit(RLIMIT_FSIZE, &saved);
+  std::signal(SIGXFSZ, previous);
+
+  EXPECT_EQ(result, -1);
+  EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - log file failed to write."}}));
+  EXPECT_EQ(*ReadFile(LogPath("g1")), before);
+}
+
+// A game may cancel a thread that is inside a call: the call runs to its
+// end, and the cancellation acts at the thread's next cancellation point.
+std::atomic<int> g_stage{0};
+void ORVANE_CALL WaitInsideCallback(LogLevel, const char *message) {
+  if (std::string_view(message).find("Analytics") == std::string_view::npos) return;
+  g_stage = 1;
+  while (g_stage != 2) ::usleep(1000); // a cancellation point
+}
+void *RecordOnce(void *) {
+  const int result = oAnalyticsInit("g1", "u1");
+  g_stage = 3 + result;
+  pthread_testcancel();
+  return nullptr;
+}
+
+TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
+  std::filesystem::create_directories(where_.logs);
+  oRegisterForLogs(WaitInsideCallback);
+  pthread_t thread;
+  ASSERT_EQ(pthread_create(&thread, nullptr, RecordOnce, nullptr), 0);
+  while (g_stage != 1) ::usleep(1000);
+  pthread_cancel(thread);
+  g_stage = 2;
+  void *outcome = nullptr;
+  pthread_join(thread, &outcome);
+  oRegisterForLogs(nullptr);
+  EXPECT_EQ(outcome, PTHREAD_CANCELED);
+  EXPECT_EQ(g_stage, 3);
+  EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
+}
+
+// Where the files go on POSIX: XDG_DATA_HOME when absolute, else
+// $HOME/.local/share.
+TEST(StorageLocation, FollowsTheEnvironment) {
+  struct Case {
+    const char *xdg;
+    const char *home;
+    std::string root;
+  };
+  const Case cases[] = {
+      {"/data/x", "/home/u", "/data/x/Orvane/"},
+      {"/data/x/", "/home/u", "/data/x/Orvane/"},
+      {"relative/x", "/home/u", "/home/u/.local/share/Orvane/"},
+      {"", "/home/u", "/home/u/.local/share/Orvane/"},
+      {nullptr, "/home/v", "/home/v/.local/share/Orvane/"},
+  };
+  const char *saved_xdg = std::getenv("XDG_DATA_HOME");
+  const char *saved_home = std::getenv("HOME");
+  std::string xdg_copy = saved_xdg ? saved_xdg : "", home_copy = saved_home ? saved_home : "";
+  for (const Case &c : cases) {
+    if (c.xdg) ::setenv("XDG_DATA_HOME", c.xdg, 1); else ::unsetenv("XDG_DATA_HOME");
+    ::setenv("HOME", c.home, 1);
+    platform::StorageLocation where = platform::default_storage_location();
+    EXPECT_EQ(where.root, c.root) << (c.xdg ? c.xdg : "(unset)");
+    EXPECT_EQ(where.logs, c.root + "Logs/");
+  }
+  if (saved_xdg) ::setenv("XDG_DATA_HOME", xdg_copy.c_str(), 1); else ::unsetenv("XDG_DATA_HOME");
+  if (saved_home) ::setenv("HOME", home_copy.c_str(), 1); else ::unsetenv("HOME");
+}
+
+} // namespace
+} // namespace orvane::testing
