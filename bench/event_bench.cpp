@@ -2,9 +2,14 @@
 //
 // Besides the Google Benchmark runs, the binary measures oAnalyticsGameEnter
 // and the floor (the bare system calls of one event) in interleaved rounds
-// and prints the median ratio; --ratio_rounds=0 skips that.
-//   --ratio_rounds=N   rounds (default 101)
-//   --ratio_batch=N    events per side and round (default 500)
+// and prints the median ratio; --ratio_rounds=0 skips that. Then it measures
+// how 1, 2 and 4 threads scale against the same threads' bare system calls,
+// and the latency of one thread's calls while three others record.
+//   --ratio_rounds=N     rounds (default 101)
+//   --ratio_batch=N      events per side and round (default 500)
+//   --scaling_rounds=N   rounds of the thread scaling (default 21; 0 skips)
+//   --scaling_batch=N    events per thread and measurement (default 400)
+//   --latency_calls=N    timed calls per latency figure (default 20000; 0 skips)
 // It restarts itself once with a 4 KiB command line, so that the identity
 // lookup reads a launcher-sized one.
 #include "bench_sandbox.h"
@@ -18,11 +23,13 @@
 #include <benchmark/benchmark.h>
 
 #include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <string>
+#include <thread>
 #include <unistd.h>
 #include <vector>
 
@@ -181,6 +188,95 @@ void CompareWithFloor(const EventSetup &setup, int rounds, int batch) {
               *std::max_element(ratio.begin(), ratio.end()));
 }
 
+// Several threads recording at once, each on a log of its own or all on one
+// log, against the same threads making the bare system calls of an event
+// (open, fstat, one write, close) on files of their own or on one file. The
+// ids and floor file names have the length of kGameId, so every line has
+// the same size.
+constexpr const char *kThreadGameIds[] = {"benc0", "benc1", "benc2", "benc3"};
+constexpr const char *kThreadFloorFiles[] = {"flor0.log", "flor1.log", "flor2.log", "flor3.log"};
+
+// Events per second of `threads` threads doing `batch` steps each, from the
+// moment they are all released together to the last one's end.
+template <class Step>
+double EventsPerSecond(int threads, int batch, Step step) {
+  std::atomic<int> ready{0};
+  std::atomic<bool> go{false};
+  std::vector<std::thread> running;
+  for (int t = 0; t < threads; ++t)
+    running.emplace_back([&, t] {
+      ++ready;
+      while (!go.load(std::memory_order_acquire)) std::this_thread::yield();
+      for (int i = 0; i < batch; ++i) step(t);
+    });
+  while (ready.load() != threads) std::this_thread::yield();
+  const auto start = std::chrono::steady_clock::now();
+  go.store(true, std::memory_order_release);
+  for (std::thread &thread : running) thread.join();
+  const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  return threads * batch / seconds;
+}
+
+void ScalingReport(const EventSetup &setup, int rounds, int batch) {
+  if (rounds <= 0) return;
+  for (const char *game : kThreadGameIds) oAnalyticsInit(game, kUserId);
+  const auto library = [](bool own) {
+    return [own](int t) {
+      if (oAnalyticsGameEnter(own ? kThreadGameIds[t] : kGameId, kUserId) != 0) std::abort();
+    };
+  };
+  const auto floor = [&setup](bool own) {
+    return [&setup, own](int t) {
+      const std::string path = own ? setup.logs + kThreadFloorFiles[t] : setup.floor_path;
+      if (FloorEvent(setup.logs.c_str(), path.c_str(), setup.line.data(), setup.line.size()) != 0) std::abort();
+    };
+  };
+  // [side][own log][threads index] -> events per second, one per round.
+  constexpr int kThreadCounts[] = {1, 2, 4};
+  std::vector<double> rate[2][2][3];
+  for (int round = 0; round < rounds; ++round)
+    for (int k = 0; k < 12; ++k) {
+      const int turn = (k + round) % 12; // every configuration takes every place in the order
+      const int side = turn % 2, own = turn / 2 % 2, n = turn / 4;
+      rate[side][own][n].push_back(side == 0 ? EventsPerSecond(kThreadCounts[n], batch, library(own))
+                                             : EventsPerSecond(kThreadCounts[n], batch, floor(own)));
+    }
+  std::printf("\nThreads recording at once: %d interleaved rounds of %d events per thread (median events/s)\n",
+              rounds, batch);
+  std::printf("  %-22s %8s %12s %8s %14s %8s %10s\n", "", "threads", "library", "x 1", "floor", "x 1",
+              "of floor's");
+  for (int own = 1; own >= 0; --own)
+    for (int n = 0; n < 3; ++n) {
+      const double lib = Median(rate[0][own][n]), flo = Median(rate[1][own][n]);
+      const double lib_scale = lib / Median(rate[0][own][0]), floor_scale = flo / Median(rate[1][own][0]);
+      std::printf("  %-22s %8d %12.0f %8.2f %14.0f %8.2f %10.2f\n", own ? "a log per thread" : "one log",
+                  kThreadCounts[n], lib, lib_scale, flo, floor_scale, lib_scale / floor_scale);
+    }
+}
+
+// Latency of one thread's calls, alone and while three others record.
+void LatencyReport(int calls) {
+  if (calls <= 0) return;
+  const auto percentiles = [calls](int others) {
+    std::atomic<bool> done{false};
+    std::vector<std::thread> busy;
+    for (int t = 1; t <= others; ++t)
+      busy.emplace_back([&done, t] {
+        while (!done.load(std::memory_order_relaxed)) oAnalyticsGameEnter(kThreadGameIds[t], kUserId);
+      });
+    std::vector<double> micros(static_cast<std::size_t>(calls));
+    for (double &us : micros) us = NanosecondsPerEvent(1, [] { oAnalyticsGameEnter(kThreadGameIds[0], kUserId); }) / 1000;
+    done = true;
+    for (std::thread &thread : busy) thread.join();
+    std::sort(micros.begin(), micros.end());
+    std::printf("  %d other threads recording: p50 %7.1f us, p99 %7.1f us\n", others, micros[micros.size() / 2],
+                micros[micros.size() * 99 / 100]);
+  };
+  std::printf("\nLatency of oAnalyticsGameEnter on one thread, %d calls\n", calls);
+  percentiles(0);
+  percentiles(3);
+}
+
 // Runs this program again with launcher-like arguments filling the command
 // line to 4 KiB, the user UUID last so that the lookup searches them all.
 void RestartWithLongCommandLine(int argc, char **argv) {
@@ -223,6 +319,9 @@ int main(int argc, char **argv) {
   RestartWithLongCommandLine(argc, argv);
   const int rounds = IntFlag(argc, argv, "--ratio_rounds", 101);
   const int batch = IntFlag(argc, argv, "--ratio_batch", 500);
+  const int scaling_rounds = IntFlag(argc, argv, "--scaling_rounds", 21);
+  const int scaling_batch = IntFlag(argc, argv, "--scaling_batch", 400);
+  const int latency_calls = IntFlag(argc, argv, "--latency_calls", 20000);
   benchmark::Initialize(&argc, argv);
 
   EventSetup setup = PrepareEvents();
@@ -230,6 +329,8 @@ int main(int argc, char **argv) {
   benchmark::RunSpecifiedBenchmarks();
   benchmark::Shutdown();
   CompareWithFloor(setup, rounds, std::max(batch, 1));
+  ScalingReport(setup, scaling_rounds, std::max(scaling_batch, 1));
+  LatencyReport(latency_calls);
   orvane::bench::CloseSandbox(setup.sandbox);
   return 0;
 }

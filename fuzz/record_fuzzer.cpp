@@ -97,8 +97,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   const std::string time = orvane::FormatTimestamp();
   std::string record;
   orvane::AppendEventRecord(record, game_id, user_id, type, time, extra);
+  static orvane::RecordCipher cipher;
   std::string hex;
-  if (!orvane::EncryptRecordText(record, hex)) Fail("encryption failed");
+  if (!orvane::EncryptRecordText(cipher, record, hex)) Fail("encryption failed");
   if (hex.size() != 2 * ((record.size() / 16 + 1) * 16)) Fail("hex length");
 
   std::string plain;

@@ -101,6 +101,38 @@ TEST_F(ConcurrencyTest, ThreadsAndProcessesShareOneLog) {
   EXPECT_LE(g_ok.load(), kThreads * kEvents + 1);
 }
 
+// Threads of one process share no lock: on logs of their own and on one log
+// together, each log still starts with one INIT line and loses nothing,
+// while the callback changes under them.
+TEST_F(ConcurrencyTest, ThreadsOnOwnAndSharedLogsWhileTheCallbackChanges) {
+  constexpr int kThreads = 4, kEvents = 60;
+  std::atomic<bool> done{false};
+  std::thread registrar([&] {
+    while (!done) {
+      oRegisterForLogs(CountMessage);
+      oRegisterForLogs(nullptr);
+    }
+  });
+  std::vector<std::thread> threads;
+  for (int t = 0; t < kThreads; ++t)
+    threads.emplace_back([t] {
+      const std::string own = "own-" + std::to_string(t);
+      for (int i = 0; i < kEvents; ++i) EXPECT_EQ(oAnalyticsGameEnter(i % 2 ? "together" : own.c_str(), "u1"), 0);
+    });
+  for (std::thread &thread : threads) thread.join();
+  done = true;
+  registrar.join();
+  const KeyBlock &block = GetKeyBlock();
+  const std::vector<std::string> keys = {std::string(block.keyText.begin(), block.keyText.end())};
+  for (int t = 0; t <= kThreads; ++t) {
+    const std::string game = t < kThreads ? "own-" + std::to_string(t) : "together";
+    const std::vector<std::string> plain = Plain(game, keys);
+    ASSERT_EQ(plain.size(), 1u + (t < kThreads ? kEvents / 2 : kThreads * kEvents / 2)) << game;
+    for (std::size_t i = 0; i < plain.size(); ++i)
+      EXPECT_EQ(plain[i].find(i == 0 ? "\"type\":\"INIT\"" : "\"type\":\"ENTER\""), 29u + game.size()) << game << i;
+  }
+}
+
 // Several processes that record the first event of a new game at once: the
 // log starts with exactly one INIT line however they interleave.
 TEST_F(ConcurrencyTest, OneInitLinePerLogAcrossProcesses) {

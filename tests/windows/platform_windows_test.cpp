@@ -101,24 +101,28 @@ TEST_F(WindowsStorageTest, MissingLevelsAreCreated) {
 TEST_F(WindowsStorageTest, AppendsOfTwoHandlesLandAtTheEnd) {
   const platform::Calls &os = platform::native_calls();
   const std::string path = Path("shared.log");
-  const platform::FileHandle outer = os.open_append(path.c_str());
+  std::int64_t size = -1;
+  const platform::FileHandle outer = os.open_log(path.c_str(), size);
   ASSERT_NE(outer, platform::kNoFile);
-  EXPECT_EQ(os.file_size(outer), 0);
-  const platform::FileHandle inner = os.open_append(path.c_str());
+  EXPECT_EQ(size, 0);
+  const platform::FileHandle inner = os.open_log(path.c_str(), size);
   ASSERT_NE(inner, platform::kNoFile);
   EXPECT_TRUE(os.append(inner, "first", 5));
   EXPECT_TRUE(os.close_file(inner));
   EXPECT_TRUE(os.append(outer, "\r\nsecond", 8));
   EXPECT_EQ(os.file_size(outer), 13);
+  // A torn first line is cut back through the append-only handle.
+  EXPECT_TRUE(os.truncate_file(outer, 5));
+  EXPECT_EQ(os.file_size(outer), 5);
 
   const HANDLE reader = ::CreateFileA(path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE,
                                       nullptr, OPEN_EXISTING, 0, nullptr);
   EXPECT_NE(reader, INVALID_HANDLE_VALUE) << "a reader is shut out";
   if (reader != INVALID_HANDLE_VALUE) ::CloseHandle(reader);
   EXPECT_TRUE(os.close_file(outer));
-  EXPECT_EQ(ReadFile(path), "first\r\nsecond");
+  EXPECT_EQ(ReadFile(path), "first");
 
-  const platform::FileHandle held = os.open_append(path.c_str());
+  const platform::FileHandle held = os.open_log(path.c_str(), size);
   ASSERT_NE(held, platform::kNoFile);
   EXPECT_TRUE(::DeleteFileA(path.c_str())) << "deletion is refused while a log is open";
   EXPECT_TRUE(os.close_file(held));
@@ -131,16 +135,17 @@ TEST_F(WindowsStorageTest, AppendsOfTwoHandlesLandAtTheEnd) {
 TEST_F(WindowsStorageTest, LockShutsOutLockersButNotWriters) {
   const platform::Calls &os = platform::native_calls();
   const std::string path = Path("locked.log");
-  const platform::FileHandle first = os.open_append(path.c_str());
-  const platform::FileHandle second = os.open_append(path.c_str());
+  std::int64_t size = -1;
+  const platform::FileHandle first = os.open_log(path.c_str(), size);
+  const platform::FileHandle second = os.open_log(path.c_str(), size);
   ASSERT_NE(first, platform::kNoFile);
   ASSERT_NE(second, platform::kNoFile);
-  ASSERT_TRUE(os.lock_file(first));
-  EXPECT_FALSE(os.lock_file(second));
+  ASSERT_EQ(os.try_lock_file(first), platform::LockResult::kLocked);
+  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kBusy);
   EXPECT_TRUE(os.append(second, "a", 1));
   EXPECT_TRUE(os.append(first, "b", 1));
   os.unlock_file(first);
-  EXPECT_TRUE(os.lock_file(second));
+  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kLocked);
   os.unlock_file(second);
   EXPECT_TRUE(os.close_file(first));
   EXPECT_TRUE(os.close_file(second));
@@ -149,10 +154,12 @@ TEST_F(WindowsStorageTest, LockShutsOutLockersButNotWriters) {
 
 TEST_F(WindowsStorageTest, FailuresOfTheFileCalls) {
   const platform::Calls &os = platform::native_calls();
-  EXPECT_EQ(os.open_append(Path("missing\\x.log").c_str()), platform::kNoFile);
-  EXPECT_EQ(os.open_append(Path("a|b.log").c_str()), platform::kNoFile);
+  std::int64_t size = -1;
+  EXPECT_EQ(os.open_log(Path("missing\\x.log").c_str(), size), platform::kNoFile);
+  EXPECT_EQ(os.open_log(Path("a|b.log").c_str(), size), platform::kNoFile);
   ASSERT_TRUE(::CreateDirectoryA(Path("dir.log").c_str(), nullptr));
-  EXPECT_EQ(os.open_append(Path("dir.log").c_str()), platform::kNoFile);
+  EXPECT_EQ(os.open_log(Path("dir.log").c_str(), size), platform::kNoFile);
+  EXPECT_EQ(os.open_log("NUL", size), platform::kNoFile) << "a device is no log";
 }
 
 TEST(WindowsClock, SecondsSince1970) {
