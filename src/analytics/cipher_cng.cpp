@@ -16,6 +16,10 @@
 
 namespace orvane::cipher {
 
+// CNG documents no key handle as safe for simultaneous use by several
+// threads (BCryptEncrypt, learn.microsoft.com: the key object carries the
+// chaining state between calls), so a session, with its own algorithm and
+// key handles, serves one thread at a time: every recording takes its own.
 struct Session {
   BCRYPT_ALG_HANDLE algorithm = nullptr;
   BCRYPT_KEY_HANDLE key = nullptr;

@@ -1,6 +1,7 @@
 // The Windows platform layer against the Windows file system.
 #include "OrvaneSDK.h"
 #include "platform/platform.h"
+#include "analytics/record_cipher.h"
 #include "sdk/storage.h"
 #include "support/test_support.h"
 
@@ -8,6 +9,8 @@
 
 #include <ctime>
 #include <string>
+#include <thread>
+#include <vector>
 
 namespace orvane::testing {
 namespace {
@@ -83,6 +86,26 @@ TEST_F(WindowsStorageTest, LinesAreSeparatedByCrLf) {
   const std::string last = DecryptLine(lines[2], key).value_or("");
   EXPECT_NE(first.find("\"type\":\"INIT\""), std::string::npos) << first;
   EXPECT_NE(last.find("\"extra\":\"score=10\""), std::string::npos) << last;
+}
+
+// Threads record at once, each with its own CNG session: every line of the
+// shared log and of their own logs decrypts, and none is lost.
+TEST_F(WindowsStorageTest, ThreadsRecordAtOnce) {
+  constexpr int kThreads = 4, kEvents = 40;
+  std::vector<std::thread> threads;
+  for (int t = 0; t < kThreads; ++t)
+    threads.emplace_back([t] {
+      const std::string own = "own" + std::to_string(t);
+      for (int i = 0; i < kEvents; ++i) EXPECT_EQ(oAnalyticsGameEnter(i % 2 ? "shared" : own.c_str(), "u1"), 0);
+    });
+  for (std::thread &thread : threads) thread.join();
+  const KeyBlock &block = GetKeyBlock();
+  const std::string key(block.keyText.begin(), block.keyText.end());
+  for (const std::string game : {"own0", "own3", "shared"}) {
+    const std::vector<std::string> lines = SplitLogLines(*ReadFile(where_.logs + game + ".log"));
+    EXPECT_EQ(lines.size(), game == "shared" ? 1u + kThreads * kEvents / 2 : 1u + kEvents / 2);
+    for (const std::string &line : lines) EXPECT_TRUE(DecryptLine(line, key).has_value()) << game;
+  }
 }
 
 TEST_F(WindowsStorageTest, MissingLevelsAreCreated) {
