@@ -14,6 +14,7 @@
 #include "analytics/record_text.h"
 #include "analytics/timestamp.h"
 #include "identity/command_line.h"
+#include "sdk/log_channel.h"
 
 #include <benchmark/benchmark.h>
 
@@ -89,6 +90,15 @@ void BM_GameEnter(benchmark::State &state) {
   state.SetItemsProcessed(state.iterations());
 }
 BENCHMARK(BM_GameEnter);
+
+// One message to a registered callback that does nothing: what the log
+// channel itself costs per message.
+void BM_LogToHost(benchmark::State &state) {
+  oRegisterForLogs(orvane::bench::IgnoreMessage);
+  for (auto _ : state) orvane::LogToHost(LogLevel::Info, "[OrvaneSDK] Analytics ENTER - OK");
+  state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(BM_LogToHost);
 
 // Composition, encryption and hex of one record of about range(0) bytes,
 // into buffers reused as the recorder reuses its own.
