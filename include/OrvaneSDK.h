@@ -16,6 +16,8 @@
  * completion on the caller's thread and delivers its messages to the
  * registered callback on that thread before it returns. No library lock is
  * held while the callback runs, so a callback may call back into the library.
+ * Replacing or removing the callback waits for its calls on other threads
+ * (see oRegisterForLogs).
  *
  * Texts: every text is zero-terminated narrow (8-bit) text, used byte for
  * byte. The library only reads a text argument during the call and keeps no
@@ -67,9 +69,9 @@ typedef int32_t LogLevel;
  * The host's log callback, called on the thread of the library call that
  * caused the message. `message` begins with "[OrvaneSDK] ", carries no line
  * end, and is valid only during the call: copy it to keep it.
- * C# declares it as [UnmanagedFunctionPointer(CallingConvention.Cdecl)]
- * delegate void LogCallback(int level, string message); keep the delegate
- * alive for as long as it is registered.
+ * The callback must return (no longjmp, no exception through C frames):
+ * withdrawing it waits for its calls to end. C# hosts use
+ * bindings/csharp/OrvaneSDK.cs, which keeps its delegate alive.
  */
 typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
 
@@ -80,6 +82,13 @@ typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
  * A null callback unregisters: messages are then dropped until a non-null
  * callback is registered. Messages sent while none is registered are lost;
  * register first to see everything.
+ *
+ * It returns only when no other thread is still inside the previous
+ * callback, so the host may then free it or unload the code behind it
+ * (a script domain, a plugin). Called from inside a callback, it does not
+ * wait for that call itself. Do not call it while holding a lock that the
+ * callback takes, nor from callbacks on two threads at once: each would wait
+ * for the other.
  */
 ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback);
 
