@@ -145,21 +145,30 @@ ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char 
  * "--gameId--" (oAuthGetGameId) in the first process argument that holds the
  * marker, up to the end of that argument.
  *
- * The result is never null.
- *   - Found: a new block from the C runtime's malloc, owned by the caller, who
- *     releases it with free() of the same C runtime. Every call returns a new
- *     block. Messages: (INFO, "[OrvaneSDK] Authentication - OK") or
+ * The result is never null and belongs to the caller, who releases it with
+ * oFreeText (below), whatever it holds.
+ *   - Found: a new block; every call returns a new one. Messages:
+ *     (INFO, "[OrvaneSDK] Authentication - OK") or
  *     (INFO, "[OrvaneSDK] Return GameID - OK").
- *   - Not found or empty: a constant empty text "" that must NOT be freed.
+ *   - Not found or empty: a constant empty text "", which oFreeText ignores.
  *     Messages: (ERROR, "[OrvaneSDK] Authentication - Failed") or
  *     (ERROR, "[OrvaneSDK] Return GameID - Empty").
- * The rule for hosts: free a non-empty result, never an empty one.
  *
  * Each UTF-16 unit of the Windows command line gives one byte, its low 8 bits
  * (on Linux each argument's bytes come back unchanged).
  */
 ORVANE_API char *ORVANE_CALL oAuthGetUserUuid(void);
 ORVANE_API char *ORVANE_CALL oAuthGetGameId(void);
+
+/*
+ * Releases a result of oAuthGetUserUuid or oAuthGetGameId with the
+ * library's own allocator: the way every host releases results, since a
+ * game built with another C runtime (MSVC, .NET) cannot free the library's
+ * blocks itself. Null and the constant empty text are ignored, so any result
+ * may be passed. (A non-empty result is a malloc block of the library's C
+ * runtime; a host on that same runtime may still free() it.)
+ */
+ORVANE_API void ORVANE_CALL oFreeText(char *text);
 
 #ifdef __cplusplus
 } /* extern "C" */
