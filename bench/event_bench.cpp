@@ -132,7 +132,7 @@ void BM_UserUuidLookup(benchmark::State &state) {
       state.SkipWithError("no --userUuid-- on the command line");
       break;
     }
-    std::free(uuid);
+    oFreeText(uuid);
   }
 }
 BENCHMARK(BM_UserUuidLookup);
