@@ -96,7 +96,9 @@ namespace Orvane
             return Native.oAnalyticsSpecial(ToUtf8(gameId), ToUtf8(userId), ToUtf8(extra));
         }
 
-        // The launcher's values from the command line; "" when absent.
+        // The launcher's values from the command line; "" when absent. On
+        // Windows the library keeps the low byte of each UTF-16 unit, so
+        // only ASCII values decode unchanged there.
         public static string GetUserUuid() { return TakeText(Native.oAuthGetUserUuid()); }
         public static string GetGameId() { return TakeText(Native.oAuthGetGameId()); }
 
