@@ -19,6 +19,7 @@
 #include "analytics/record_text.h"
 #include "analytics/timestamp.h"
 #include "identity/command_line.h"
+#include "sdk/log_channel.h"
 
 #include <benchmark/benchmark.h>
 
@@ -97,6 +98,15 @@ void BM_GameEnter(benchmark::State &state) {
 }
 BENCHMARK(BM_GameEnter);
 
+// One message to a registered callback that does nothing: what the log
+// channel itself costs per message.
+void BM_LogToHost(benchmark::State &state) {
+  oRegisterForLogs(orvane::bench::IgnoreMessage);
+  for (auto _ : state) orvane::LogToHost(LogLevel::Info, "[OrvaneSDK] Analytics ENTER - OK");
+  state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(BM_LogToHost);
+
 // Composition, encryption and hex of one record of about range(0) bytes,
 // into buffers reused as the recorder reuses its own.
 void BM_RecordLine(benchmark::State &state) {
@@ -130,7 +140,7 @@ void BM_UserUuidLookup(benchmark::State &state) {
       state.SkipWithError("no --userUuid-- on the command line");
       break;
     }
-    std::free(uuid);
+    oFreeText(uuid);
   }
 }
 BENCHMARK(BM_UserUuidLookup);

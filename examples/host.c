@@ -28,7 +28,6 @@
 #include "OrvaneSDK.h"
 
 #include <stdio.h>
-#include <stdlib.h>
 #include <string.h>
 
 #ifdef _WIN32
@@ -73,6 +72,7 @@ typedef void(ORVANE_CALL *initialize_fn)(void);
 typedef int32_t(ORVANE_CALL *event_fn)(const char *, const char *);
 typedef int32_t(ORVANE_CALL *special_fn)(const char *, const char *, const char *);
 typedef char *(ORVANE_CALL *identity_fn)(void);
+typedef void(ORVANE_CALL *free_text_fn)(char *);
 
 static struct {
   register_fn register_for_logs;
@@ -80,6 +80,7 @@ static struct {
   event_fn init, enter, exit;
   special_fn special;
   identity_fn user_uuid, game_id;
+  free_text_fn free_text;
 } sdk;
 
 static void ORVANE_CALL print_message(LogLevel level, const char *message) {
@@ -114,20 +115,19 @@ static int load(const char *path) {
   FIND(special, "oAnalyticsSpecial");
   FIND(user_uuid, "oAuthGetUserUuid");
   FIND(game_id, "oAuthGetGameId");
+  FIND(free_text, "oFreeText");
 #undef FIND
   return 1;
 }
 
-/* Prints an identity result and releases it by the library's rule: free a
- * non-empty result, never an empty one. */
+/* Prints an identity result. Unless a found one is kept, it goes back to the
+ * library's own allocator at once, empty or not: a host never frees results
+ * with its own C runtime. */
 static char *show_identity(const char *name, char *result, int keep) {
-  if (result[0] == '\0') {
-    printf("%s() = \"\" (not found)\n", name);
-    return NULL;
-  }
-  printf("%s() = \"%s\"\n", name, result);
-  if (keep) return result;
-  free(result);
+  if (result[0] == '\0') printf("%s() = \"\" (not found)\n", name);
+  else printf("%s() = \"%s\"\n", name, result);
+  if (keep && result[0] != '\0') return result;
+  sdk.free_text(result);
   return NULL;
 }
 
@@ -149,8 +149,8 @@ static int demo(void) {
   failures += show_event("oAnalyticsSpecial", sdk.special(game_id, user_id, "level=3;score=1200")) != 0;
   failures += show_event("oAnalyticsSpecial", sdk.special(game_id, user_id, "boss \"Hydra\" defeated")) != 0;
   failures += show_event("oAnalyticsGameExit", sdk.exit(game_id, user_id)) != 0;
-  free(user);
-  free(game);
+  sdk.free_text(user); /* null when not found: ignored */
+  sdk.free_text(game);
   return failures ? 1 : 0;
 }
 

@@ -16,6 +16,8 @@
  * completion on the caller's thread and delivers its messages to the
  * registered callback on that thread before it returns. No library lock is
  * held while the callback runs, so a callback may call back into the library.
+ * Replacing or removing the callback waits for its calls on other threads
+ * (see oRegisterForLogs).
  *
  * Texts: every text is zero-terminated narrow (8-bit) text, used byte for
  * byte. The library only reads a text argument during the call and keeps no
@@ -67,9 +69,9 @@ typedef int32_t LogLevel;
  * The host's log callback, called on the thread of the library call that
  * caused the message. `message` begins with "[OrvaneSDK] ", carries no line
  * end, and is valid only during the call: copy it to keep it.
- * C# declares it as [UnmanagedFunctionPointer(CallingConvention.Cdecl)]
- * delegate void LogCallback(int level, string message); keep the delegate
- * alive for as long as it is registered.
+ * The callback must return (no longjmp, no exception through C frames):
+ * withdrawing it waits for its calls to end. C# hosts use
+ * bindings/csharp/OrvaneSDK.cs, which keeps its delegate alive.
  */
 typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
 
@@ -80,6 +82,13 @@ typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
  * A null callback unregisters: messages are then dropped until a non-null
  * callback is registered. Messages sent while none is registered are lost;
  * register first to see everything.
+ *
+ * It returns only when no other thread is still inside the previous
+ * callback, so the host may then free it or unload the code behind it
+ * (a script domain, a plugin). Called from inside a callback, it does not
+ * wait for that call itself. Do not call it while holding a lock that the
+ * callback takes, nor from callbacks on two threads at once: each would wait
+ * for the other.
  */
 ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback);
 
@@ -136,21 +145,30 @@ ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char 
  * "--gameId--" (oAuthGetGameId) in the first process argument that holds the
  * marker, up to the end of that argument.
  *
- * The result is never null.
- *   - Found: a new block from the C runtime's malloc, owned by the caller, who
- *     releases it with free() of the same C runtime. Every call returns a new
- *     block. Messages: (INFO, "[OrvaneSDK] Authentication - OK") or
+ * The result is never null and belongs to the caller, who releases it with
+ * oFreeText (below), whatever it holds.
+ *   - Found: a new block; every call returns a new one. Messages:
+ *     (INFO, "[OrvaneSDK] Authentication - OK") or
  *     (INFO, "[OrvaneSDK] Return GameID - OK").
- *   - Not found or empty: a constant empty text "" that must NOT be freed.
+ *   - Not found or empty: a constant empty text "", which oFreeText ignores.
  *     Messages: (ERROR, "[OrvaneSDK] Authentication - Failed") or
  *     (ERROR, "[OrvaneSDK] Return GameID - Empty").
- * The rule for hosts: free a non-empty result, never an empty one.
  *
  * Each UTF-16 unit of the Windows command line gives one byte, its low 8 bits
  * (on Linux each argument's bytes come back unchanged).
  */
 ORVANE_API char *ORVANE_CALL oAuthGetUserUuid(void);
 ORVANE_API char *ORVANE_CALL oAuthGetGameId(void);
+
+/*
+ * Releases a result of oAuthGetUserUuid or oAuthGetGameId with the
+ * library's own allocator: the way every host releases results, since a
+ * game built with another C runtime (MSVC, .NET) cannot free the library's
+ * blocks itself. Null and the constant empty text are ignored, so any result
+ * may be passed. (A non-empty result is a malloc block of the library's C
+ * runtime; a host on that same runtime may still free() it.)
+ */
+ORVANE_API void ORVANE_CALL oFreeText(char *text);
 
 #ifdef __cplusplus
 } /* extern "C" */

@@ -1,4 +1,4 @@
-# Fails unless the library's dynamic symbol table defines exactly the eight
+# Fails unless the library's dynamic symbol table defines exactly the nine
 # exported functions.
 execute_process(COMMAND nm -D --defined-only ${LIBRARY}
   OUTPUT_VARIABLE table RESULT_VARIABLE failed)
@@ -6,7 +6,7 @@ if(failed)
   message(FATAL_ERROR "nm could not read ${LIBRARY}")
 endif()
 set(expected oAnalyticsGameEnter oAnalyticsGameExit oAnalyticsInit oAnalyticsSpecial
-  oAuthGetGameId oAuthGetUserUuid oInitialize oRegisterForLogs)
+  oAuthGetGameId oAuthGetUserUuid oFreeText oInitialize oRegisterForLogs)
 string(REGEX MATCHALL "[0-9a-f]+ [TtWwDdBbRrVviu] [^\n]+" rows "${table}")
 set(found "")
 foreach(row IN LISTS rows)

@@ -3,8 +3,11 @@
 #include "sdk/log_channel.h"
 #include "support/test_support.h"
 
+#include <atomic>
+#include <chrono>
 #include <cstdlib>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace orvane::testing {
@@ -93,6 +96,40 @@ TEST(LogChannel, CallbackMayCallTheLibrary) {
   oRegisterForLogs(Reenter);
   oRegisterForLogs(nullptr);
   EXPECT_EQ(g_reentered, 1);
+}
+
+// Withdrawing a callback waits for its calls on other threads: this one is
+// still running when the unregistering thread arrives, and has returned
+// when oRegisterForLogs does.
+std::atomic<bool> g_inside{false}, g_returned{false};
+void ORVANE_CALL Linger(LogLevel, const char *message) {
+  if (std::string(message) != kNote) return;
+  g_inside = true;
+  std::this_thread::sleep_for(std::chrono::milliseconds(200));
+  g_returned = true;
+}
+
+TEST(LogChannel, WithdrawingWaitsForCallsOnOtherThreads) {
+  oRegisterForLogs(Linger);
+  std::thread reporter([] { LogToHost(LogLevel::Info, kNote); });
+  while (!g_inside) std::this_thread::yield();
+  oRegisterForLogs(nullptr);
+  EXPECT_TRUE(g_returned);
+  reporter.join();
+}
+
+// A callback that withdraws itself does not wait for its own call (it would
+// hang), and hears nothing afterwards.
+int g_withdrawn = 0;
+void ORVANE_CALL WithdrawSelf(LogLevel, const char *) {
+  ++g_withdrawn;
+  oRegisterForLogs(nullptr);
+}
+
+TEST(LogChannel, CallbackMayWithdrawItself) {
+  oRegisterForLogs(WithdrawSelf);
+  LogToHost(LogLevel::Info, kNote);
+  EXPECT_EQ(g_withdrawn, 1);
 }
 
 } // namespace

@@ -15,7 +15,9 @@ namespace orvane {
 // none is registered.
 void LogToHost(LogLevel level, const char *message) noexcept;
 
-// Replaces the registered callback; a non-null one is greeted at once.
+// Replaces the registered callback and returns once no other thread is
+// still running the previous one; a non-null one is then greeted. A call
+// from inside a callback does not wait for the delivery it runs in.
 void RegisterForLogs(LogCallback callback) noexcept;
 
 // The messages of one exported call, in the order they arose. They go to the

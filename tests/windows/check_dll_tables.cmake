@@ -1,4 +1,4 @@
-# Fails unless the DLL's export table holds exactly the eight functions under
+# Fails unless the DLL's export table holds exactly the nine functions under
 # their plain names and its import table names only system DLLs, so that a
 # game ships OrvaneSDK.dll alone: no libstdc++, libgcc or winpthread DLL.
 #
@@ -18,7 +18,7 @@ string(STRIP "${names}" names)
 string(REPLACE "\n" ";" exports "${names}")
 list(SORT exports)
 set(expected oAnalyticsGameEnter oAnalyticsGameExit oAnalyticsInit oAnalyticsSpecial
-  oAuthGetGameId oAuthGetUserUuid oInitialize oRegisterForLogs)
+  oAuthGetGameId oAuthGetUserUuid oFreeText oInitialize oRegisterForLogs)
 if(NOT exports STREQUAL expected)
   message(FATAL_ERROR "exports differ\n  expected: ${expected}\n  found:    ${exports}")
 endif()

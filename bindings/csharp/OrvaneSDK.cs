@@ -1,0 +1,183 @@
+// OrvaneSDK for C#: the library's exports for Unity and for plain .NET or
+// mono, in one file. The native library is found under the name "OrvaneSDK":
+// OrvaneSDK.dll on Windows, libOrvaneSDK.so on Linux.
+//
+//   OrvaneSDK.RegisterForLogs((level, message) => Console.WriteLine(message));
+//   string user = OrvaneSDK.GetUserUuid(), game = OrvaneSDK.GetGameId();
+//   if (user != "" && game != "") OrvaneSDK.AnalyticsGameEnter(game, user);
+//
+// Every call may come from any thread. Texts cross as UTF-8 both ways; a null
+// text stays null (the library reads it as empty). Messages reach the
+// handler on the thread of the call that caused them, before it returns.
+using System;
+using System.Runtime.InteropServices;
+using System.Text;
+using System.Threading;
+
+namespace Orvane
+{
+    public enum LogLevel { Info = 0, Warning = 1, Error = 2 }
+
+    public static class OrvaneSDK
+    {
+        // The exports as they are. Texts are zero-terminated UTF-8 byte
+        // arrays. An identity result belongs to the caller, who releases it
+        // with oFreeText: the marshaller's own free (what a `string` result
+        // would get) is another allocator and crashes on the library's blocks.
+        public static class Native
+        {
+            const string Library = "OrvaneSDK";
+
+            [UnmanagedFunctionPointer(CallingConvention.Cdecl)]
+            public delegate void LogCallback(int level, IntPtr message);
+
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern void oRegisterForLogs(LogCallback callback);
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern void oInitialize();
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern int oAnalyticsInit(byte[] gameId, byte[] userId);
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern int oAnalyticsGameEnter(byte[] gameId, byte[] userId);
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern int oAnalyticsGameExit(byte[] gameId, byte[] userId);
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern int oAnalyticsSpecial(byte[] gameId, byte[] userId, byte[] extra);
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern IntPtr oAuthGetUserUuid();
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern IntPtr oAuthGetGameId();
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern void oFreeText(IntPtr text);
+        }
+
+        static volatile Action<LogLevel, string> handler;
+        // Kept for the life of the domain, so the library never calls a
+        // collected delegate.
+        static readonly Native.LogCallback nativeCallback = OnNativeLog;
+        static int unloadHooked;
+
+        // Registers the one handler of the process (null unregisters). It
+        // at once receives (Info, "[OrvaneSDK] Logging initiated."). Returns
+        // only when no other thread is still inside the previous handler.
+        public static void RegisterForLogs(Action<LogLevel, string> newHandler)
+        {
+            if (newHandler == null)
+            {
+                Native.oRegisterForLogs(null);
+                handler = null;
+                return;
+            }
+            HookUnload();
+            handler = newHandler;
+            Native.oRegisterForLogs(nativeCallback);
+        }
+
+        public static void Initialize() { Native.oInitialize(); }
+
+        // 0 on success, -1 when refused or not written (see the messages).
+        public static int AnalyticsInit(string gameId, string userId)
+        {
+            return Native.oAnalyticsInit(ToUtf8(gameId), ToUtf8(userId));
+        }
+
+        public static int AnalyticsGameEnter(string gameId, string userId)
+        {
+            return Native.oAnalyticsGameEnter(ToUtf8(gameId), ToUtf8(userId));
+        }
+
+        public static int AnalyticsGameExit(string gameId, string userId)
+        {
+            return Native.oAnalyticsGameExit(ToUtf8(gameId), ToUtf8(userId));
+        }
+
+        public static int AnalyticsSpecial(string gameId, string userId, string extra)
+        {
+            return Native.oAnalyticsSpecial(ToUtf8(gameId), ToUtf8(userId), ToUtf8(extra));
+        }
+
+        // The launcher's values from the command line; "" when absent. On
+        // Windows the library keeps the low byte of each UTF-16 unit, so
+        // only ASCII values decode unchanged there.
+        public static string GetUserUuid() { return TakeText(Native.oAuthGetUserUuid()); }
+        public static string GetGameId() { return TakeText(Native.oAuthGetGameId()); }
+
+        // IL2CPP hands only static methods marked so to native code.
+        [AOT.MonoPInvokeCallback(typeof(Native.LogCallback))]
+        static void OnNativeLog(int level, IntPtr message)
+        {
+            // An exception must not unwind into the library's frames: the
+            // call would never count as ended, and withdrawing would hang.
+            try
+            {
+                Action<LogLevel, string> current = handler;
+                if (current != null) current((LogLevel)level, FromUtf8(message));
+            }
+            catch (Exception e)
+            {
+#if UNITY_5_3_OR_NEWER
+                UnityEngine.Debug.LogException(e);
+#else
+                Console.Error.WriteLine(e);
+#endif
+            }
+        }
+
+        // The native library stays loaded when a script domain goes (Unity
+        // reloads scripts in the Editor; a host may unload an AppDomain):
+        // the handler is withdrawn first, or the library would call code
+        // that no longer exists.
+        static void HookUnload()
+        {
+            if (Interlocked.Exchange(ref unloadHooked, 1) != 0) return;
+            AppDomain.CurrentDomain.DomainUnload += delegate { Withdraw(); };
+#if UNITY_EDITOR
+            UnityEditor.AssemblyReloadEvents.beforeAssemblyReload += Withdraw;
+#endif
+#if UNITY_5_3_OR_NEWER
+            UnityEngine.Application.quitting += Withdraw;
+#endif
+        }
+
+        static void Withdraw()
+        {
+            if (handler != null) RegisterForLogs(null);
+        }
+
+        static byte[] ToUtf8(string text)
+        {
+            if (text == null) return null;
+            byte[] bytes = new byte[Encoding.UTF8.GetByteCount(text) + 1];
+            Encoding.UTF8.GetBytes(text, 0, text.Length, bytes, 0);
+            return bytes;
+        }
+
+        // Copied at once: a message lives only during the callback.
+        static string FromUtf8(IntPtr text)
+        {
+            int length = 0;
+            while (Marshal.ReadByte(text, length) != 0) ++length;
+            byte[] bytes = new byte[length];
+            Marshal.Copy(text, bytes, 0, length);
+            return Encoding.UTF8.GetString(bytes);
+        }
+
+        static string TakeText(IntPtr result)
+        {
+            try { return FromUtf8(result); }
+            finally { Native.oFreeText(result); }
+        }
+    }
+}
+
+#if !UNITY_5_3_OR_NEWER
+namespace AOT
+{
+    // Unity defines this attribute; elsewhere the callback's marker is ours.
+    [AttributeUsage(AttributeTargets.Method)]
+    sealed class MonoPInvokeCallbackAttribute : Attribute
+    {
+        public MonoPInvokeCallbackAttribute(Type type) { }
+    }
+}
+#endif
