@@ -3,13 +3,24 @@
 #include "analytics/cipher.h"
 #include "analytics/key_text.h"
 
+#include <array>
+
 namespace orvane::logcat {
 namespace {
 
-int LowerHexValue(char c) {
-  if (c >= '0' && c <= '9') return c - '0';
-  if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-  return -1;
+// Each byte's value as a lowercase hex digit, or -1: one lookup per
+// character, since reading a folder is mostly turning hex into bytes.
+constexpr std::array<std::int8_t, 256> kHexValue = [] {
+  std::array<std::int8_t, 256> value{};
+  value.fill(-1);
+  for (int c = 0; c < 16; ++c) value[static_cast<unsigned char>("0123456789abcdef"[c])] = static_cast<std::int8_t>(c);
+  return value;
+}();
+
+bool AllHex(std::string_view line) {
+  for (char c : line)
+    if (kHexValue[static_cast<unsigned char>(c)] < 0) return false;
+  return true;
 }
 
 } // namespace
@@ -38,14 +49,16 @@ void CloseLogKey(LogKey &key) {
 }
 
 LineFault TakeCiphertext(std::string_view line, LineBuffers &buffers) {
-  for (char c : line)
-    if (LowerHexValue(c) < 0) return LineFault::kNotHex;
-  if (line.empty() || line.size() % (2 * cipher::kBlockSize) != 0) return LineFault::kNotBlocks;
+  if (line.empty() || line.size() % (2 * cipher::kBlockSize) != 0)
+    return AllHex(line) ? LineFault::kNotBlocks : LineFault::kNotHex;
   const std::size_t size = line.size() / 2;
   buffers.ciphertext.resize(size);
-  for (std::size_t i = 0; i < size; ++i)
-    buffers.ciphertext[i] =
-        static_cast<std::uint8_t>(LowerHexValue(line[2 * i]) * 16 + LowerHexValue(line[2 * i + 1]));
+  for (std::size_t i = 0; i < size; ++i) {
+    const int high = kHexValue[static_cast<unsigned char>(line[2 * i])];
+    const int low = kHexValue[static_cast<unsigned char>(line[2 * i + 1])];
+    if ((high | low) < 0) return LineFault::kNotHex;
+    buffers.ciphertext[i] = static_cast<std::uint8_t>(high << 4 | low);
+  }
   return LineFault::kNone;
 }
 
@@ -55,12 +68,9 @@ LineFault DecryptRecord(const LogKey &key, LineBuffers &buffers, EventRecord &re
   const std::ptrdiff_t plain =
       cipher::backend().decrypt(key.session, buffers.ciphertext.data(), size, buffers.plaintext.data());
   if (plain < 0) return LineFault::kBadPadding;
-  buffers.text.assign(reinterpret_cast<const char *>(buffers.plaintext.data()),
-                      static_cast<std::size_t>(plain));
-  auto parsed = ParseEventRecord(buffers.text);
-  if (!parsed) return LineFault::kNotRecord;
-  record = std::move(*parsed);
-  return LineFault::kNone;
+  const std::string_view text(reinterpret_cast<const char *>(buffers.plaintext.data()),
+                              static_cast<std::size_t>(plain));
+  return ParseEventRecord(text, record) ? LineFault::kNone : LineFault::kNotRecord;
 }
 
 } // namespace orvane::logcat

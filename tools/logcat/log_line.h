@@ -42,15 +42,15 @@ void CloseLogKey(LogKey &key);
 struct LineBuffers {
   std::vector<std::uint8_t> ciphertext;
   std::vector<std::uint8_t> plaintext;
-  std::string text; // the decrypted record text, after a decryption
 };
 
 // Turns a line (its line break already removed) into its ciphertext bytes
 // in `buffers.ciphertext`; kNotHex or kNotBlocks when it cannot be one.
 LineFault TakeCiphertext(std::string_view line, LineBuffers &buffers);
 
-// Decrypts the ciphertext in `buffers` under `key` and parses the record.
-// kNone with `record` filled, kBadPadding or kNotRecord.
+// Decrypts the ciphertext in `buffers` under `key` and parses the record
+// into `record`, whose strings keep their capacity from line to line.
+// kNone, kBadPadding or kNotRecord.
 LineFault DecryptRecord(const LogKey &key, LineBuffers &buffers, EventRecord &record);
 
 } // namespace orvane::logcat
