@@ -3,7 +3,7 @@
 # Usage: scripts/install-deps.sh [linux|all]   (all adds mingw-w64, wine, clang)
 set -euo pipefail
 
-packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind)
+packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind python3)
 if [ "${1:-all}" = all ]; then
   # wine answers the DLL's CNG calls with GnuTLS, a recommendation only.
   packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30)
