@@ -29,8 +29,10 @@ KEYS
     game id it recorded, so one file can mix keys line by line. Each line is
     tried with the key of the file's own game id (its name without ".log"),
     then with the keys of the other *.log files in the same folder, then
-    with each --key-game-id. The first key that decrypts the line with valid
-    padding and gives a record wins, and is tried first for the next line.
+    with each --key-game-id, and last with the key of an empty game id (a
+    process whose first call had none). The first key that decrypts the
+    line with valid padding and gives a record wins, and is tried first for
+    the next line.
 
 OUTPUT
     Each record keeps its stored form: the five members in the stored order,

@@ -14,6 +14,7 @@
 #include <cstdio>
 #include <cstring>
 #include <deque>
+#include <exception>
 #include <filesystem>
 #include <string>
 #include <string_view>
@@ -98,7 +99,13 @@ bool AddSource(Reader &reader, const fs::path &path) {
     ListFolderKeys(source);
   }
   for (const std::string &id : reader.options.key_game_ids) AddCandidate(source.keys, id);
-  if (!source.keys.game_ids.empty()) return true;
+  if (!source.keys.game_ids.empty()) {
+    // The first call of a process fixes the key even when it is refused, so
+    // a process whose first call had an empty game id wrote under the fixed
+    // key text alone, which no log's name gives.
+    AddCandidate(source.keys, "");
+    return true;
+  }
   Complain(source.is_stdin ? "standard input has no file name to take the game id from; give --key-game-id"
                            : source.name + ": the name does not end in .log and its folder holds no "
                                            "other log, so no key is known; give --key-game-id");
@@ -256,6 +263,15 @@ bool ReadAvailable(Reader &reader, Source &source) {
   return any;
 }
 
+// Reads a folder's *.log files where the folder stands among the arguments.
+void AddFolder(Reader &reader, const fs::path &path) {
+  const std::size_t before = reader.sources.size();
+  ScanFolder(reader, reader.folders.emplace_back(Folder{path}));
+  std::error_code error;
+  if (reader.sources.size() == before && fs::is_directory(path, error))
+    Complain(path.string() + ": holds no .log files");
+}
+
 // Turns the arguments into sources and folders; false on a usage error.
 bool AddArguments(Reader &reader) {
   std::vector<std::string> paths = reader.options.paths;
@@ -266,26 +282,18 @@ bool AddArguments(Reader &reader) {
       Complain("this machine gives no place for the logs (no home folder); name a folder");
       return false;
     }
-    reader.folders.push_back({logs});
+    AddFolder(reader, logs);
   }
   bool ok = true;
   for (const std::string &path : paths) {
     std::error_code error;
-    if (path != "-" && fs::is_directory(path, error)) reader.folders.push_back({path});
+    if (path != "-" && fs::is_directory(path, error)) AddFolder(reader, path);
     else ok &= AddSource(reader, path);
-  }
-  for (Folder &folder : reader.folders) {
-    const std::size_t before = reader.sources.size();
-    ScanFolder(reader, folder);
-    if (reader.sources.size() == before && fs::is_directory(folder.path))
-      Complain(folder.path.string() + ": holds no .log files");
   }
   return ok;
 }
 
-} // namespace
-
-int main(int argc, char **argv) {
+int Run(int argc, char **argv) {
   Reader reader;
   if (auto options = ParseOptions(argc, argv)) {
     reader.options = std::move(*options);
@@ -322,4 +330,17 @@ int main(int argc, char **argv) {
   }
   std::fflush(stdout);
   return reader.status;
+}
+
+} // namespace
+
+int main(int argc, char **argv) {
+  // A file name the system cannot convert, or memory running out, ends the
+  // run with a reason rather than an abort.
+  try {
+    return Run(argc, argv);
+  } catch (const std::exception &error) {
+    Complain(error.what());
+    return 2;
+  }
 }
