@@ -1,5 +1,6 @@
 // Hostile event texts: whatever bytes a game passes as game id, user id and
-// extra, its record must decrypt and read back as exactly those values.
+// extra, its record must decrypt, read back as exactly those values and be
+// written back as the very text that was encrypted.
 //
 // Input: type selector byte, then game id, user id and extra separated by
 // zero bytes (the exports take C strings, so no value can hold one).
@@ -111,5 +112,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   if (parsed->game_id != game_id || parsed->user_id != user_id || parsed->type != type ||
       parsed->time != time || parsed->extra != extra)
     Fail("values read back differ from the values passed");
+  // Written back, the record is exactly the text the library composed.
+  std::string written;
+  orvane::logcat::AppendRecordJson(written, *parsed);
+  if (written != record) Fail("record written back differs from the composed text");
   return 0;
 }

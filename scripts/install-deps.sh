@@ -3,9 +3,10 @@
 # Usage: scripts/install-deps.sh [linux|all]   (all adds mingw-w64, wine, clang)
 set -euo pipefail
 
-# mono-mcs and mono-runtime compile and run the C# binding's tests.
+# mono-mcs and mono-runtime compile and run the C# binding's tests; python3
+# is the strict JSON parser of the log reader's tests.
 packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind
-  mono-mcs mono-runtime)
+  mono-mcs mono-runtime python3)
 if [ "${1:-all}" = all ]; then
   # wine answers the DLL's CNG calls with GnuTLS, a recommendation only.
   packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30)

@@ -4,47 +4,53 @@
 
 #include "record_json.h"
 
-#include "analytics/cipher.h"
-
 #include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
+
+namespace orvane::cipher {
+struct Session;
+}
 
 namespace orvane::logcat {
 
 // Why a line gave no record.
 enum class LineFault {
   kNone,
-  kNotHex,       // a character other than 0-9 and a-f
-  kNotBlocks,    // hex, but not whole 16-byte blocks (odd, short or empty)
-  kBadPadding,   // does not decrypt under the key: wrong key or damaged
-  kNotRecord,    // decrypts, but is not a JSON object with the five members
+  kNotHex,     // a character other than 0-9 and a-f
+  kNotBlocks,  // hex, but not whole 16-byte blocks (odd, short or empty)
+  kBadPadding, // no key tried decrypts it: damaged, or a key not among them
+  kNotRecord,  // decrypts, but is not a JSON object with the five members
 };
 
 // The text that the reader prints for `fault`.
 std::string_view FaultText(LineFault fault);
 
-// A cipher session for the logs of one key game id: the library's key text
-// ("OrvaneLogKey-01" and the first 65 bytes of the id) and its backend.
+// A cipher session for the logs that one key game id encrypted: the
+// library's key text ("OrvaneLogKey-01" and the first 65 bytes of the id).
 struct LogKey {
   cipher::Session *session = nullptr;
-  std::vector<std::uint8_t> ciphertext; // buffers reused from line to line
-  std::vector<std::uint8_t> plaintext;
 };
 
 // Null session when the backend failed (its reason went to standard error).
 LogKey OpenLogKey(std::string_view key_game_id);
 void CloseLogKey(LogKey &key);
 
-struct DecodedLine {
-  LineFault fault = LineFault::kNone;
-  std::string text; // the decrypted record text, when it decrypted
-  EventRecord record;
+// Buffers reused from line to line, so that reading allocates nothing per
+// line once they have grown.
+struct LineBuffers {
+  std::vector<std::uint8_t> ciphertext;
+  std::vector<std::uint8_t> plaintext;
 };
 
-// Decodes one line, its line break already removed (a trailing CR is the
-// caller's to strip).
-DecodedLine DecodeLine(LogKey &key, std::string_view line);
+// Turns a line (its line break already removed) into its ciphertext bytes
+// in `buffers.ciphertext`; kNotHex or kNotBlocks when it cannot be one.
+LineFault TakeCiphertext(std::string_view line, LineBuffers &buffers);
+
+// Decrypts the ciphertext in `buffers` under `key` and parses the record
+// into `record`, whose strings keep their capacity from line to line.
+// kNone, kBadPadding or kNotRecord.
+LineFault DecryptRecord(const LogKey &key, LineBuffers &buffers, EventRecord &record);
 
 } // namespace orvane::logcat

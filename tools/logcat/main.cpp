@@ -1,15 +1,21 @@
 // orvane-logcat: reads games' encrypted log files back into records, one JSON
-// object per line, checks them, and follows them as a game appends.
-#include "log_line.h"
+// object per line, checks them, and follows them as games append.
+#include "key_discovery.h"
 #include "log_lines.h"
+#include "log_sources.h"
+#include "options.h"
+#include "standard_input.h"
+#include "valid_utf8.h"
+
+#include "analytics/record_text.h"
 
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
-#include <cstdlib>
 #include <cstring>
+#include <deque>
+#include <exception>
 #include <filesystem>
-#include <optional>
 #include <string>
 #include <string_view>
 #include <system_error>
@@ -19,153 +25,152 @@
 namespace {
 
 using namespace orvane::logcat;
-
-constexpr std::string_view kUsage = R"(Usage: orvane-logcat [--key-game-id ID] [--check] [--follow] FILE...
-
-Reads OrvaneSDK log files (one encrypted record per line) and writes each
-record to standard output as one JSON object per line (JSON Lines), ready for
-jq or any ingestion pipeline:
-
-  {"user_id":"...","game_id":"...","type":"...","time":"...","extra":"..."}
-
-The members come in the order the library stores them, escaped as the library
-escapes them (" as \", \ as \\, bytes below 0x20 as \b \f \n \r \t or
-\u00XX). Every other byte is written as it came: a game may pass text that
-is not UTF-8, the library stores those bytes unchanged, and so does this
-tool. A record the library wrote is printed exactly as it was encrypted.
-
-FILE is a log file such as ~/.local/share/Orvane/Logs/GAME.log; "-" reads
-standard input (and needs --key-game-id).
-
-Options:
-  --key-game-id ID  Decrypt with the key of game id ID (only its first 65
-                    bytes count, as in the library). Without it, each file's
-                    own game id is used: its name without ".log". A process
-                    encrypts the logs of every game under the first game id
-                    it saw, so a second game's log of the same process needs
-                    the first game's id here.
-  --check           Print no records; print "FILE: N records, M bad lines"
-                    for each file instead.
-  --follow          After the end of each file, keep reading lines as they
-                    are appended, like tail -f, until interrupted. A file
-                    that does not exist yet is waited for. Standard input is
-                    read to its end and not followed.
-  --help            Print this text and exit.
-  --                Every later argument is a file.
-
-Line breaks may be LF or CR LF; empty lines (a log begins with one when the
-first record of a game could not be written) carry no record and are
-skipped. A line that is not lowercase hex of whole 16-byte blocks, does not
-decrypt (bad padding: a damaged line or the wrong key game id), or is not a
-JSON object with the five members is reported on standard error as
-FILE:LINE: reason, and the tool goes on with the next line.
-
-Exit status: 0 when every line was a good record, 1 when some lines were
-bad, 2 on a usage error or when a file could not be read.
-)";
-
-struct Options {
-  std::optional<std::string> key_game_id;
-  bool check = false;
-  bool follow = false;
-  std::vector<std::string> files;
-};
+namespace fs = std::filesystem;
 
 struct Source {
-  std::string name; // as given on the command line
+  fs::path path;
+  std::string name;      // as reports show it
+  std::string file_name; // the "file" member
   bool is_stdin = false;
+  fs::path folder;                  // where new candidate keys may appear; empty for stdin
+  fs::file_time_type folder_time{}; // of the folder when it was last listed
+  KeyCandidates keys;
   std::FILE *file = nullptr;
-  bool done = false;            // nothing more will be read from it
-  bool said_waiting = false;    // the "does not exist yet" notice went out
-  bool unreadable = false;      // could not be opened or read
-  LogKey key;
+  bool done = false;             // nothing more will be read from it
+  bool said_waiting = false;     // the "does not exist yet" notice went out
+  bool unreadable = false;       // could not be opened or read
   LineSplitter lines;
-  std::uint64_t offset = 0;     // bytes read so far
-  std::size_t shown_partial = 0; // size of an unended line already printed, or 0
+  std::uint64_t offset = 0;      // bytes read so far
+  std::size_t shown_partial = 0; // size of an unended line already taken, or 0
   std::uint64_t records = 0;
   std::uint64_t bad_lines = 0;
+  std::uint64_t not_utf8 = 0; // records that held bytes not part of valid UTF-8
 };
 
-int g_status = 0;
+struct Folder {
+  fs::path path;
+  bool said_waiting = false;
+};
 
-void Raise(int status) {
-  if (status > g_status) g_status = status;
+struct Reader {
+  Options options;
+  KeyPool pool;
+  std::deque<Source> sources; // a deque, since following a folder adds to it
+  std::vector<Folder> folders;
+  LineBuffers buffers;
+  EventRecord record;
+  std::string json; // one record's text before it is made valid UTF-8
+  int status = 0;
+};
+
+void Raise(Reader &reader, int status) {
+  if (status > reader.status) reader.status = status;
 }
 
 void Complain(const std::string &text) {
   std::fprintf(stderr, "orvane-logcat: %s\n", text.c_str());
 }
 
-std::optional<Options> ParseOptions(int argc, char **argv) {
-  Options options;
-  bool only_files = false;
-  for (int i = 1; i < argc; ++i) {
-    const std::string_view arg = argv[i];
-    if (only_files || arg == "-" || !arg.starts_with("-")) {
-      options.files.emplace_back(arg);
-    } else if (arg == "--") {
-      only_files = true;
-    } else if (arg == "--help") {
-      std::fwrite(kUsage.data(), 1, kUsage.size(), stdout);
-      std::exit(0);
-    } else if (arg == "--check") {
-      options.check = true;
-    } else if (arg == "--follow") {
-      options.follow = true;
-    } else if (arg == "--key-game-id") {
-      if (i + 1 == argc) {
-        Complain("--key-game-id needs a game id");
-        return std::nullopt;
-      }
-      options.key_game_id = argv[++i];
-    } else if (arg.starts_with("--key-game-id=")) {
-      options.key_game_id = std::string(arg.substr(std::strlen("--key-game-id=")));
-    } else {
-      Complain("unknown option " + std::string(arg));
-      return std::nullopt;
+// Adds the game ids of the source's folder to its candidates. True when the
+// folder changed since it was last listed and gave a new one: a process
+// whose first game is new there may have written the line that no key read.
+bool ListFolderKeys(Source &source) {
+  if (source.folder.empty()) return false;
+  std::error_code error;
+  const fs::file_time_type time = fs::last_write_time(source.folder, error);
+  if (error || time == source.folder_time) return false;
+  source.folder_time = time;
+  bool added = false;
+  for (const std::string &id : GameIdsIn(source.folder)) added |= AddCandidate(source.keys, id);
+  return added;
+}
+
+bool AddSource(Reader &reader, const fs::path &path) {
+  for (const Source &known : reader.sources)
+    if (!known.is_stdin && known.path == path) return true;
+  Source &source = reader.sources.emplace_back();
+  source.path = path;
+  source.name = path.string();
+  source.is_stdin = path == "-";
+  source.file_name = source.is_stdin ? "-" : path.filename().string();
+  if (!source.is_stdin) {
+    if (const auto own = GameIdOfLogName(path)) AddCandidate(source.keys, *own);
+    source.folder = path.has_parent_path() ? path.parent_path() : fs::path(".");
+    ListFolderKeys(source);
+  }
+  for (const std::string &id : reader.options.key_game_ids) AddCandidate(source.keys, id);
+  if (!source.keys.game_ids.empty()) {
+    // The first call of a process fixes the key even when it is refused, so
+    // a process whose first call had an empty game id wrote under the fixed
+    // key text alone, which no log's name gives.
+    AddCandidate(source.keys, "");
+    return true;
+  }
+  Complain(source.is_stdin ? "standard input has no file name to take the game id from; give --key-game-id"
+                           : source.name + ": the name does not end in .log and its folder holds no "
+                                           "other log, so no key is known; give --key-game-id");
+  return false;
+}
+
+// Adds the folder's *.log files that are not read yet.
+void ScanFolder(Reader &reader, Folder &folder) {
+  std::error_code error;
+  if (!fs::is_directory(folder.path, error)) {
+    if (!reader.options.follow) {
+      Complain(folder.path.string() + ": no such folder (no game has recorded here yet?)");
+      Raise(reader, 2);
+    } else if (!folder.said_waiting) {
+      Complain(folder.path.string() + ": does not exist yet; waiting for it");
     }
-  }
-  if (options.files.empty()) {
-    Complain("no log file given");
-    return std::nullopt;
-  }
-  if (options.check && options.follow) {
-    Complain("--check and --follow do not go together: a followed file has no end to sum up at");
-    return std::nullopt;
-  }
-  return options;
-}
-
-// The game id whose key a file's records are under, unless given.
-std::optional<std::string> KeyGameIdOf(const Options &options, const std::string &name) {
-  if (options.key_game_id) return options.key_game_id;
-  if (name == "-") {
-    Complain("standard input has no file name to take the game id from; give --key-game-id");
-    return std::nullopt;
-  }
-  const std::string file = std::filesystem::path(name).filename().string();
-  constexpr std::string_view kExtension = ".log";
-  if (!file.ends_with(kExtension)) {
-    Complain(name + ": the name does not end in .log, so it gives no game id; give --key-game-id");
-    return std::nullopt;
-  }
-  return file.substr(0, file.size() - kExtension.size());
-}
-
-void TakeLine(Source &source, const Options &options, std::uint64_t number, std::string_view line,
-              std::string &out) {
-  if (line.empty()) return;
-  const DecodedLine decoded = DecodeLine(source.key, line);
-  if (decoded.fault != LineFault::kNone) {
-    ++source.bad_lines;
-    Raise(1);
-    Complain(source.name + ":" + std::to_string(number) + ": " + std::string(FaultText(decoded.fault)));
+    folder.said_waiting = true;
     return;
   }
+  for (const fs::path &file : LogFilesIn(folder.path)) AddSource(reader, file);
+}
+
+// Reads one line. True when a key read it, whether or not the filters pass
+// it. A line that no key reads is reported only when `report` is set: an
+// unended line may still be growing.
+bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_view line,
+              std::string &out, bool report) {
+  if (line.empty()) return false;
+  LineFault fault = ReadLine(reader.pool, source.keys, line, reader.buffers, reader.record);
+  if ((fault == LineFault::kBadPadding || fault == LineFault::kNotRecord) && ListFolderKeys(source))
+    fault = ReadLine(reader.pool, source.keys, line, reader.buffers, reader.record);
+  if (fault != LineFault::kNone) {
+    if (!report) return false;
+    ++source.bad_lines;
+    Raise(reader, 1);
+    Complain(source.name + ":" + std::to_string(number) + ": " + std::string(FaultText(fault)));
+    return false;
+  }
+  if (!Passes(reader.options.filter, reader.record)) return true;
   ++source.records;
-  if (options.check) return;
-  AppendRecordJson(out, decoded.record);
+  const std::size_t start = out.size();
+  std::string &json = reader.json;
+  json.clear();
+  AppendRecordJson(json, reader.record);
+  const bool more = reader.options.with_file || reader.options.show_key;
+  if (more) json.pop_back(); // the added members go inside the record's closing brace
+  if (AppendValidUtf8(out, json) != 0) ++source.not_utf8;
+  if (more) {
+    json.clear();
+    if (reader.options.with_file) {
+      json += ",\"file\":\"";
+      orvane::AppendJsonEscaped(json, source.file_name);
+      json += '"';
+    }
+    if (reader.options.show_key) {
+      json += ",\"key_game_id\":\"";
+      orvane::AppendJsonEscaped(json, source.keys.game_ids[source.keys.winner]);
+      json += '"';
+    }
+    json += '}';
+    AppendValidUtf8(out, json);
+  }
   out += '\n';
+  if (reader.options.check) out.resize(start);
+  return true;
 }
 
 void Emit(std::string &out) {
@@ -176,7 +181,7 @@ void Emit(std::string &out) {
 }
 
 // Opens a file source; in follow mode a missing file is waited for.
-bool Open(Source &source, const Options &options) {
+bool Open(Reader &reader, Source &source) {
   if (source.is_stdin) {
     source.file = stdin;
     return true;
@@ -184,13 +189,13 @@ bool Open(Source &source, const Options &options) {
   source.file = std::fopen(source.name.c_str(), "rb");
   if (source.file != nullptr) return true;
   const int error = errno;
-  if (options.follow && error == ENOENT) {
+  if (reader.options.follow && error == ENOENT) {
     if (!source.said_waiting) Complain(source.name + ": does not exist yet; waiting for it");
     source.said_waiting = true;
     return false;
   }
   Complain(source.name + ": cannot open: " + std::strerror(error));
-  Raise(2);
+  Raise(reader, 2);
   source.done = true;
   source.unreadable = true;
   return false;
@@ -200,7 +205,7 @@ bool Open(Source &source, const Options &options) {
 // or cut: read it again from the start.
 void NoticeTruncation(Source &source) {
   std::error_code error;
-  const auto size = std::filesystem::file_size(source.name, error);
+  const auto size = fs::file_size(source.path, error);
   if (error || size >= source.offset) return;
   Complain(source.name + ": became shorter; reading it again from the start");
   std::fclose(source.file);
@@ -211,12 +216,13 @@ void NoticeTruncation(Source &source) {
 }
 
 // Reads what the source holds now. Returns true when it read any bytes.
-bool ReadAvailable(Source &source, const Options &options) {
+bool ReadAvailable(Reader &reader, Source &source) {
+  const bool follow = reader.options.follow && !source.is_stdin;
   if (source.done) return false;
-  if (source.file != nullptr && options.follow && !source.is_stdin) NoticeTruncation(source);
-  if (source.file == nullptr && !Open(source, options)) return false;
+  if (source.file != nullptr && follow) NoticeTruncation(source);
+  if (source.file == nullptr && !Open(reader, source)) return false;
   std::string out;
-  char buffer[1 << 16];
+  static char buffer[1 << 16];
   bool any = false;
   for (;;) {
     const std::size_t n = std::fread(buffer, 1, sizeof buffer, source.file);
@@ -225,89 +231,116 @@ bool ReadAvailable(Source &source, const Options &options) {
     source.offset += n;
     FeedBytes(source.lines, std::string_view(buffer, n),
               [&](std::uint64_t number, std::string_view line) {
-                // Printed already while it was the last, unended line.
+                // Taken already while it was the last, unended line.
                 if (source.shown_partial != 0 && line.size() == source.shown_partial) {
                   source.shown_partial = 0;
                   return;
                 }
                 source.shown_partial = 0;
-                TakeLine(source, options, number, line, out);
+                TakeLine(reader, source, number, line, out, true);
               });
     Emit(out);
   }
   if (std::ferror(source.file)) {
     Complain(source.name + ": read error: " + std::strerror(errno));
-    Raise(2);
+    Raise(reader, 2);
     source.done = true;
     source.unreadable = true;
   }
   std::clearerr(source.file);
   const std::string_view last = PartialLine(source.lines);
-  const bool at_end = source.done || !options.follow || source.is_stdin;
-  if (at_end) {
-    TakeLine(source, options, source.lines.next_number, last, out);
+  if (source.done || !follow) {
+    TakeLine(reader, source, source.lines.next_number, last, out, true);
     source.done = true;
   } else if (!last.empty() && source.shown_partial == 0) {
     // The library writes no line break after the last line, so the newest
-    // record has none yet. It is printed as soon as it decodes; an unended
+    // record has none yet. It is taken as soon as it decodes; an unended
     // line that does not decode may still be growing and waits for its end.
-    const DecodedLine decoded = DecodeLine(source.key, last);
-    if (decoded.fault == LineFault::kNone) {
-      ++source.records;
-      AppendRecordJson(out, decoded.record);
-      out += '\n';
+    if (TakeLine(reader, source, source.lines.next_number, last, out, false))
       source.shown_partial = last.size();
-    }
   }
   Emit(out);
   return any;
 }
 
-} // namespace
+// Reads a folder's *.log files where the folder stands among the arguments.
+void AddFolder(Reader &reader, const fs::path &path) {
+  const std::size_t before = reader.sources.size();
+  ScanFolder(reader, reader.folders.emplace_back(Folder{path}));
+  std::error_code error;
+  if (reader.sources.size() == before && fs::is_directory(path, error))
+    Complain(path.string() + ": holds no .log files");
+}
 
-int main(int argc, char **argv) {
-  const std::optional<Options> options = ParseOptions(argc, argv);
-  if (!options) {
+// Turns the arguments into sources and folders; false on a usage error.
+bool AddArguments(Reader &reader) {
+  std::vector<std::string> paths = reader.options.paths;
+  if (paths.empty() && StandardInputIsGiven()) paths.push_back("-");
+  if (paths.empty()) {
+    const fs::path logs = DefaultLogsFolder();
+    if (logs.empty()) {
+      Complain("this machine gives no place for the logs (no home folder); name a folder");
+      return false;
+    }
+    AddFolder(reader, logs);
+  }
+  bool ok = true;
+  for (const std::string &path : paths) {
+    std::error_code error;
+    if (path != "-" && fs::is_directory(path, error)) AddFolder(reader, path);
+    else ok &= AddSource(reader, path);
+  }
+  return ok;
+}
+
+int Run(int argc, char **argv) {
+  Reader reader;
+  if (auto options = ParseOptions(argc, argv)) {
+    reader.options = std::move(*options);
+  } else {
     std::fputs("Try 'orvane-logcat --help'.\n", stderr);
     return 2;
   }
+  if (!AddArguments(reader)) return 2;
 
-  std::vector<Source> sources(options->files.size());
-  for (std::size_t i = 0; i < sources.size(); ++i) {
-    Source &source = sources[i];
-    source.name = options->files[i];
-    source.is_stdin = source.name == "-";
-    const std::optional<std::string> key_game_id = KeyGameIdOf(*options, source.name);
-    if (!key_game_id) return 2;
-    source.key = OpenLogKey(*key_game_id);
-    if (source.key.session == nullptr) {
-      Complain("the cipher could not be prepared");
-      return 2;
+  for (Source &source : reader.sources) {
+    ReadAvailable(reader, source);
+    if (reader.options.check && !source.unreadable)
+      std::printf("%s: %llu records, %llu bad lines, %llu records with bytes not UTF-8\n",
+                  source.name.c_str(), static_cast<unsigned long long>(source.records),
+                  static_cast<unsigned long long>(source.bad_lines),
+                  static_cast<unsigned long long>(source.not_utf8));
+  }
+  while (reader.options.follow) {
+    for (Folder &folder : reader.folders) ScanFolder(reader, folder);
+    bool any = false, open = !reader.folders.empty();
+    for (Source &source : reader.sources) {
+      any |= ReadAvailable(reader, source);
+      open |= !source.done;
     }
+    if (!open) break;
+    if (!any) std::this_thread::sleep_for(std::chrono::milliseconds(100));
   }
-
-  for (Source &source : sources) {
-    ReadAvailable(source, *options);
-    if (options->check && !source.unreadable)
-      std::printf("%s: %llu records, %llu bad lines\n", source.name.c_str(),
-                  static_cast<unsigned long long>(source.records),
-                  static_cast<unsigned long long>(source.bad_lines));
-  }
-  if (options->follow) {
-    for (;;) {
-      bool any = false, open = false;
-      for (Source &source : sources) {
-        any |= ReadAvailable(source, *options);
-        open |= !source.done;
-      }
-      if (!open) break;
-      if (!any) std::this_thread::sleep_for(std::chrono::milliseconds(100));
-    }
-  }
-  for (Source &source : sources) {
+  for (Source &source : reader.sources)
     if (source.file != nullptr && !source.is_stdin) std::fclose(source.file);
-    CloseLogKey(source.key);
+  CloseKeyPool(reader.pool);
+  if (reader.pool.failed) {
+    Complain("the cipher could not be prepared for some key");
+    Raise(reader, 2);
   }
   std::fflush(stdout);
-  return g_status;
+  return reader.status;
+}
+
+} // namespace
+
+int main(int argc, char **argv) {
+  // A file name the system cannot convert, or memory running out, ends the
+  // run with a reason rather than an abort.
+  try {
+    return Run(argc, argv);
+  } catch (const std::exception &error) {
+    Complain(error.what());
+    return 2;
+  }
 }

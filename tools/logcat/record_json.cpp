@@ -74,21 +74,23 @@ std::optional<std::uint32_t> ReadUnicodeEscape(Cursor &in) {
   return 0x10000 + ((*first - 0xd800) << 10) + (*second - 0xdc00);
 }
 
-// A JSON string, unescaped. Raw bytes of 0x80 and above pass as they are,
-// valid UTF-8 or not: that is how the library stores a game's bytes.
-std::optional<std::string> ReadString(Cursor &in) {
-  if (!in.Take('"')) return std::nullopt;
-  std::string value;
+// True for a byte that a JSON string may hold as it is.
+bool StandsForItself(char c) { return c != '"' && c != '\\' && static_cast<unsigned char>(c) >= 0x20; }
+
+// A JSON string, unescaped into `value`. Raw bytes of 0x80 and above pass
+// as they are, valid UTF-8 or not: that is how the library stores a game's
+// bytes. Runs without an escape are copied in one piece.
+bool ReadString(Cursor &in, std::string &value) {
+  value.clear();
+  if (!in.Take('"')) return false;
   for (;;) {
-    if (in.AtEnd()) return std::nullopt;
+    const std::size_t run = in.at;
+    while (!in.AtEnd() && StandsForItself(in.Peek())) ++in.at;
+    value.append(in.text, run, in.at - run);
+    if (in.AtEnd()) return false;
     const char c = in.text[in.at++];
-    if (c == '"') return value;
-    if (static_cast<unsigned char>(c) < 0x20) return std::nullopt;
-    if (c != '\\') {
-      value += c;
-      continue;
-    }
-    if (in.AtEnd()) return std::nullopt;
+    if (c == '"') return true;
+    if (c != '\\' || in.AtEnd()) return false; // a control byte, or an escape cut off
     switch (in.text[in.at++]) {
     case '"': value += '"'; break;
     case '\\': value += '\\'; break;
@@ -100,12 +102,12 @@ std::optional<std::string> ReadString(Cursor &in) {
     case 't': value += '\t'; break;
     case 'u': {
       const auto code = ReadUnicodeEscape(in);
-      if (!code) return std::nullopt;
+      if (!code) return false;
       AppendUtf8(value, *code);
       break;
     }
     default:
-      return std::nullopt;
+      return false;
     }
   }
 }
@@ -121,34 +123,36 @@ std::string *MemberFor(EventRecord &record, std::string_view name) {
 
 } // namespace
 
-std::optional<EventRecord> ParseEventRecord(std::string_view text) {
+bool ParseEventRecord(std::string_view text, EventRecord &record) {
   Cursor in{text};
-  EventRecord record;
   std::array<const std::string *, 5> seen{};
   std::size_t count = 0;
+  std::string name;
   in.SkipSpace();
-  if (!in.Take('{')) return std::nullopt;
+  if (!in.Take('{')) return false;
   for (;;) {
     in.SkipSpace();
-    const auto name = ReadString(in);
-    if (!name) return std::nullopt;
-    std::string *member = MemberFor(record, *name);
-    if (member == nullptr) return std::nullopt;
+    if (!ReadString(in, name)) return false;
+    std::string *member = MemberFor(record, name);
+    if (member == nullptr) return false;
     for (std::size_t i = 0; i < count; ++i)
-      if (seen[i] == member) return std::nullopt;
+      if (seen[i] == member) return false;
     seen[count++] = member;
     in.SkipSpace();
-    if (!in.Take(':')) return std::nullopt;
+    if (!in.Take(':')) return false;
     in.SkipSpace();
-    auto value = ReadString(in);
-    if (!value) return std::nullopt;
-    *member = std::move(*value);
+    if (!ReadString(in, *member)) return false;
     in.SkipSpace();
     if (in.Take('}')) break;
-    if (count == seen.size() || !in.Take(',')) return std::nullopt;
+    if (count == seen.size() || !in.Take(',')) return false;
   }
   in.SkipSpace();
-  if (!in.AtEnd() || count != seen.size()) return std::nullopt;
+  return in.AtEnd() && count == seen.size();
+}
+
+std::optional<EventRecord> ParseEventRecord(std::string_view text) {
+  EventRecord record;
+  if (!ParseEventRecord(text, record)) return std::nullopt;
   return record;
 }
 

@@ -1,0 +1,42 @@
+#include "log_sources.h"
+
+#include "platform/platform.h"
+
+#include <algorithm>
+#include <system_error>
+
+namespace orvane::logcat {
+
+std::optional<std::string> GameIdOfLogName(const std::filesystem::path &file) {
+  // The library names a log by the game id's own bytes, so the narrow form
+  // of the name gives those bytes back.
+  const std::string name = file.filename().string();
+  constexpr std::string_view kExtension = ".log";
+  if (name.size() <= kExtension.size() || !name.ends_with(kExtension)) return std::nullopt;
+  return name.substr(0, name.size() - kExtension.size());
+}
+
+std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folder) {
+  std::vector<std::filesystem::path> files;
+  std::error_code error;
+  for (std::filesystem::directory_iterator entry(folder, error), end; !error && entry != end;
+       entry.increment(error)) {
+    std::error_code type_error;
+    if (entry->is_regular_file(type_error) && GameIdOfLogName(entry->path()))
+      files.push_back(entry->path());
+  }
+  std::sort(files.begin(), files.end());
+  return files;
+}
+
+std::vector<std::string> GameIdsIn(const std::filesystem::path &folder) {
+  std::vector<std::string> ids;
+  for (const auto &file : LogFilesIn(folder)) ids.push_back(*GameIdOfLogName(file));
+  return ids;
+}
+
+std::filesystem::path DefaultLogsFolder() {
+  return std::filesystem::path(platform::default_storage_location().logs);
+}
+
+} // namespace orvane::logcat
