@@ -28,6 +28,7 @@
 #include "OrvaneSDK.h"
 
 #include <stdio.h>
+#include <stdlib.h>
 #include <string.h>
 
 #ifdef _WIN32
