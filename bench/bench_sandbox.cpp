@@ -1,6 +1,6 @@
 #include "bench_sandbox.h"
 
-#include "sdk/storage.h"
+#include "core/storage.h"
 
 #include <cstdio>
 #include <cstdlib>

@@ -16,10 +16,10 @@
 #include "event_floor.h"
 
 #include "analytics/record_cipher.h"
-#include "analytics/record_text.h"
-#include "analytics/timestamp.h"
+#include "logformat/record_text.h"
+#include "logformat/timestamp.h"
 #include "identity/command_line.h"
-#include "sdk/log_channel.h"
+#include "core/log_channel.h"
 
 #include <benchmark/benchmark.h>
 
@@ -29,6 +29,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <string>
 #include <thread>
 #include <unistd.h>
@@ -113,13 +114,13 @@ void BM_RecordLine(benchmark::State &state) {
   orvane::TimestampCache clock;
   orvane::RecordCipher cipher;
   std::string record, line;
-  orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.Now(), "");
+  orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.At(std::time(nullptr)), "");
   const std::size_t wanted = static_cast<std::size_t>(state.range(0));
   const std::string extra(wanted > record.size() ? wanted - record.size() : 0, 'x');
   for (auto _ : state) {
     record.clear();
     line.clear();
-    orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.Now(), extra);
+    orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.At(std::time(nullptr)), extra);
     if (!orvane::EncryptRecordText(cipher, record, line)) std::abort();
     benchmark::DoNotOptimize(line.data());
   }

@@ -4,11 +4,11 @@
 //
 // Input: type selector byte, then game id, user id and extra separated by
 // zero bytes (the exports take C strings, so no value can hold one).
-#include "analytics/key_text.h"
+#include "logformat/key_text.h"
 #include "analytics/record_cipher.h"
-#include "analytics/record_text.h"
-#include "analytics/timestamp.h"
-#include "record_json.h"
+#include "logformat/record_text.h"
+#include "logformat/timestamp.h"
+#include "logformat/record_json.h"
 
 #include <openssl/evp.h>
 
@@ -17,6 +17,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -95,7 +96,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   const orvane::KeyBlock &block = orvane::GetKeyBlock();
   if (block.keyTextTaken == nullptr) Fail("key text taken");
 
-  const std::string time = orvane::FormatTimestamp();
+  const std::string time = orvane::FormatTimestampAt(std::time(nullptr));
   std::string record;
   orvane::AppendEventRecord(record, game_id, user_id, type, time, extra);
   static orvane::RecordCipher cipher;
@@ -107,14 +108,14 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   if (!DecryptIndependently(hex, block.keyText.data(), plain)) Fail("independent decryption");
   if (plain != record) Fail("decrypted text differs from the record");
 
-  const auto parsed = orvane::logcat::ParseEventRecord(plain);
+  const auto parsed = orvane::ParseEventRecord(plain);
   if (!parsed) Fail("record is not a JSON object with the five members");
   if (parsed->game_id != game_id || parsed->user_id != user_id || parsed->type != type ||
       parsed->time != time || parsed->extra != extra)
     Fail("values read back differ from the values passed");
   // Written back, the record is exactly the text the library composed.
   std::string written;
-  orvane::logcat::AppendRecordJson(written, *parsed);
+  orvane::AppendRecordJson(written, *parsed);
   if (written != record) Fail("record written back differs from the composed text");
   return 0;
 }

@@ -2,7 +2,7 @@
 // at once: no line lost, torn or interleaved, and one INIT line per log.
 #include "OrvaneSDK.h"
 #include "analytics/record_cipher.h"
-#include "sdk/storage.h"
+#include "core/storage.h"
 #include "support/child_process.h"
 #include "support/test_support.h"
 

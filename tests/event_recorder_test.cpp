@@ -1,7 +1,7 @@
 // The event recorder through the four analytics exports: messages in order,
 // results, and the exact bytes of the log file.
 #include "OrvaneSDK.h"
-#include "analytics/cipher.h"
+#include "cipher/cipher.h"
 #include "analytics/record_cipher.h"
 #include "support/test_support.h"
 

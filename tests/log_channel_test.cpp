@@ -1,6 +1,6 @@
 // The host log channel: who hears which message, after which registration.
 #include "OrvaneSDK.h"
-#include "sdk/log_channel.h"
+#include "core/log_channel.h"
 #include "support/test_support.h"
 
 #include <atomic>

@@ -1,7 +1,7 @@
 // What only POSIX systems have: file modes, links, FIFOs, a real full disk,
 // thread cancellation, and where the files go.
 #include "OrvaneSDK.h"
-#include "sdk/storage.h"
+#include "core/storage.h"
 #include "support/test_support.h"
 
 #include <atomic>

@@ -1,7 +1,7 @@
 // Record encryption: known-answer vectors that every cipher backend must
 // reproduce, sizes and padding checked by decrypting with OpenSSL directly.
-#include "analytics/cipher.h"
-#include "analytics/key_text.h"
+#include "cipher/cipher.h"
+#include "logformat/key_text.h"
 #include "analytics/record_cipher.h"
 #include "support/test_support.h"
 

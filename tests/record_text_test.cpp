@@ -1,5 +1,5 @@
 // The record text of an event, byte for byte.
-#include "analytics/record_text.h"
+#include "logformat/record_text.h"
 #include "platform/platform.h"
 
 #include <gtest/gtest.h>

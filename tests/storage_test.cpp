@@ -1,7 +1,7 @@
 // Storage directories: what oInitialize creates, in which order, and what it
 // reports.
 #include "OrvaneSDK.h"
-#include "sdk/storage.h"
+#include "core/storage.h"
 #include "support/test_support.h"
 
 #include <filesystem>

@@ -1,5 +1,5 @@
 // The record's time stamp from fixed instants, and PadNumber.
-#include "analytics/timestamp.h"
+#include "logformat/timestamp.h"
 #include "platform/platform.h"
 
 #include <gtest/gtest.h>

@@ -2,10 +2,10 @@
 
 #include "analytics/game_id.h"
 #include "analytics/record_cipher.h"
-#include "analytics/record_text.h"
-#include "analytics/timestamp.h"
+#include "logformat/record_text.h"
+#include "logformat/timestamp.h"
 #include "platform/platform.h"
-#include "sdk/storage.h"
+#include "core/storage.h"
 
 #include <atomic>
 #include <string>
@@ -226,7 +226,7 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
 
   // The line is ready before the lock is taken: the lock then covers only
   // measuring the file again and writing, however slow the cipher is.
-  const std::string_view time = space.clock.Now();
+  const std::string_view time = space.clock.At(os.now_seconds());
   space.line.clear();
   if (!is_init) space.line = platform::line_break();
   if (const Encoded encoded = EncodeLine(space, event, type, time, space.line); encoded != Encoded::kLine) {

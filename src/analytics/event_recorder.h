@@ -2,7 +2,7 @@
 // with its INIT line, and appends the event's encrypted line.
 #pragma once
 
-#include "sdk/log_channel.h"
+#include "core/log_channel.h"
 
 #include <cstdint>
 

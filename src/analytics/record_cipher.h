@@ -2,8 +2,8 @@
 // AES-256-CBC ciphertext under the process's key block.
 #pragma once
 
-#include "analytics/cipher.h"
-#include "analytics/key_text.h"
+#include "cipher/cipher.h"
+#include "logformat/key_text.h"
 
 #include <string>
 #include <string_view>
@@ -43,8 +43,5 @@ struct RecordCipher {
 // Appends the hex text of the encrypted `record` to `hex`. False when the
 // cipher failed: the reason went to standard error and `hex` is unchanged.
 bool EncryptRecordText(RecordCipher &state, std::string_view record, std::string &hex);
-
-// Appends two lowercase hex digits per byte.
-void AppendHex(std::string &out, const std::uint8_t *bytes, std::size_t size);
 
 } // namespace orvane

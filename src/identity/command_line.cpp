@@ -1,6 +1,6 @@
 #include "identity/command_line.h"
 
-#include "sdk/empty_text.h"
+#include "core/empty_text.h"
 
 #include <cstdlib>
 #include <cstring>

@@ -1,11 +1,11 @@
 // The reading library: record texts parsed and made valid UTF-8; log lines
 // read with candidate keys, split from a file's bytes, and filtered.
 #include "key_discovery.h"
-#include "log_lines.h"
+#include "logformat/log_lines.h"
 #include "record_filter.h"
 #include "valid_utf8.h"
 
-#include "analytics/cipher.h"
+#include "cipher/cipher.h"
 
 #include <gtest/gtest.h>
 

@@ -1,7 +1,7 @@
 #include "support/test_support.h"
 
-#include "sdk/log_channel.h"
-#include "sdk/storage.h"
+#include "core/log_channel.h"
+#include "core/storage.h"
 
 #include <openssl/evp.h>
 

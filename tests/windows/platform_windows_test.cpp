@@ -2,7 +2,7 @@
 #include "OrvaneSDK.h"
 #include "platform/platform.h"
 #include "analytics/record_cipher.h"
-#include "sdk/storage.h"
+#include "core/storage.h"
 #include "support/test_support.h"
 
 #include <windows.h>

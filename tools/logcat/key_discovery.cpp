@@ -1,6 +1,6 @@
 #include "key_discovery.h"
 
-#include "analytics/key_text.h"
+#include "logformat/key_text.h"
 
 namespace orvane::logcat {
 namespace {

@@ -1,30 +1,10 @@
 #include "log_line.h"
 
-#include "analytics/cipher.h"
-#include "analytics/key_text.h"
-
-#include <array>
+#include "cipher/cipher.h"
+#include "logformat/hex.h"
+#include "logformat/key_text.h"
 
 namespace orvane::logcat {
-namespace {
-
-// Each byte's value as a lowercase hex digit, or -1: one lookup per
-// character, since reading a folder is mostly turning hex into bytes.
-constexpr std::array<std::int8_t, 256> kHexValue = [] {
-  std::array<std::int8_t, 256> value{};
-  value.fill(-1);
-  for (int c = 0; c < 16; ++c)
-    value[static_cast<unsigned char>("0123456789abcdef"[c])] = static_cast<std::int8_t>(c);
-  return value;
-}();
-
-bool AllHex(std::string_view line) {
-  for (char c : line)
-    if (kHexValue[static_cast<unsigned char>(c)] < 0) return false;
-  return true;
-}
-
-} // namespace
 
 std::string_view FaultText(LineFault fault) {
   switch (fault) {
@@ -51,16 +31,8 @@ void CloseLogKey(LogKey &key) {
 
 LineFault TakeCiphertext(std::string_view line, LineBuffers &buffers) {
   if (line.empty() || line.size() % (2 * cipher::kBlockSize) != 0)
-    return AllHex(line) ? LineFault::kNotBlocks : LineFault::kNotHex;
-  const std::size_t size = line.size() / 2;
-  buffers.ciphertext.resize(size);
-  for (std::size_t i = 0; i < size; ++i) {
-    const int high = kHexValue[static_cast<unsigned char>(line[2 * i])];
-    const int low = kHexValue[static_cast<unsigned char>(line[2 * i + 1])];
-    if ((high | low) < 0) return LineFault::kNotHex;
-    buffers.ciphertext[i] = static_cast<std::uint8_t>(high << 4 | low);
-  }
-  return LineFault::kNone;
+    return IsLowerHex(line) ? LineFault::kNotBlocks : LineFault::kNotHex;
+  return DecodeHex(line, buffers.ciphertext) ? LineFault::kNone : LineFault::kNotHex;
 }
 
 LineFault DecryptRecord(const LogKey &key, LineBuffers &buffers, EventRecord &record) {

@@ -2,7 +2,7 @@
 // library's own key text and cipher.
 #pragma once
 
-#include "record_json.h"
+#include "logformat/record_json.h"
 
 #include <cstdint>
 #include <string>

@@ -1,13 +1,13 @@
 // orvane-logcat: reads games' encrypted log files back into records, one JSON
 // object per line, checks them, and follows them as games append.
 #include "key_discovery.h"
-#include "log_lines.h"
+#include "logformat/log_lines.h"
 #include "log_sources.h"
 #include "options.h"
 #include "standard_input.h"
 #include "valid_utf8.h"
 
-#include "analytics/record_text.h"
+#include "logformat/record_text.h"
 
 #include <cerrno>
 #include <chrono>

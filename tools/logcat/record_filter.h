@@ -1,7 +1,7 @@
 // Which records the reader passes on: a time window and a set of types.
 #pragma once
 
-#include "record_json.h"
+#include "logformat/record_json.h"
 
 #include <string>
 #include <string_view>

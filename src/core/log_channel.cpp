@@ -1,4 +1,4 @@
-#include "sdk/log_channel.h"
+#include "core/log_channel.h"
 
 #include <atomic>
 #include <chrono>

@@ -1,5 +1,5 @@
 // Record cipher on OpenSSL's libcrypto (EVP interface).
-#include "analytics/cipher.h"
+#include "cipher/cipher.h"
 
 #include <openssl/err.h>
 #include <openssl/crypto.h>

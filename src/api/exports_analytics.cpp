@@ -1,7 +1,7 @@
 // Exports of the analytics event log: thin forwarders to the recorder.
 #include "OrvaneSDK.h"
 #include "analytics/event_recorder.h"
-#include "sdk/export_guard.h"
+#include "api/export_guard.h"
 
 namespace {
 

@@ -1,11 +1,11 @@
-#include "record_json.h"
+#include "logformat/record_json.h"
 
-#include "analytics/record_text.h"
+#include "logformat/record_text.h"
 
 #include <array>
 #include <cstdint>
 
-namespace orvane::logcat {
+namespace orvane {
 namespace {
 
 struct Cursor {
@@ -160,4 +160,4 @@ void AppendRecordJson(std::string &out, const EventRecord &record) {
   AppendEventRecord(out, record.game_id, record.user_id, record.type, record.time, record.extra);
 }
 
-} // namespace orvane::logcat
+} // namespace orvane

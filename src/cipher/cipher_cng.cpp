@@ -1,6 +1,6 @@
 // Record cipher on Windows CNG (bcrypt.dll): part of every Windows system,
 // so a game ships nothing beside the DLL for it.
-#include "analytics/cipher.h"
+#include "cipher/cipher.h"
 
 #define WIN32_LEAN_AND_MEAN
 #ifndef NOMINMAX // libstdc++ on mingw defines it already

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-namespace orvane::logcat {
+namespace orvane {
 
 struct EventRecord {
   std::string user_id;
@@ -35,4 +35,4 @@ bool ParseEventRecord(std::string_view text, EventRecord &record);
 // the library wrote this reproduces the decrypted text byte for byte.
 void AppendRecordJson(std::string &out, const EventRecord &record);
 
-} // namespace orvane::logcat
+} // namespace orvane

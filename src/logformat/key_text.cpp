@@ -1,4 +1,4 @@
-#include "analytics/key_text.h"
+#include "logformat/key_text.h"
 
 #include <algorithm>
 

@@ -14,15 +14,12 @@ std::string PadNumber(std::int64_t value, int width);
 // The time stamp text of the instant `seconds` after 1970-01-01T00:00:00 UTC.
 std::string FormatTimestampAt(std::int64_t seconds);
 
-// The time stamp text of the current moment.
-std::string FormatTimestamp();
-
-// The time stamp of the current moment without formatting more than once a
-// second: events come many times a second and the text changes once.
+// The time stamp of `seconds` without formatting more than once a second:
+// events come many times a second and the text changes once.
 struct TimestampCache {
   std::int64_t seconds = INT64_MIN;
   std::string text;
-  std::string_view Now();
+  std::string_view At(std::int64_t now);
 };
 
 } // namespace orvane

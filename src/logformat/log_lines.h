@@ -7,7 +7,7 @@
 #include <string>
 #include <string_view>
 
-namespace orvane::logcat {
+namespace orvane {
 
 struct LineSplitter {
   std::string partial;           // bytes of the line not yet ended
@@ -43,4 +43,4 @@ inline std::string_view PartialLine(const LineSplitter &lines) {
   return text;
 }
 
-} // namespace orvane::logcat
+} // namespace orvane

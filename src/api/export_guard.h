@@ -3,7 +3,7 @@
 #pragma once
 
 #include "platform/platform.h"
-#include "sdk/log_channel.h"
+#include "core/log_channel.h"
 
 #include <utility>
 

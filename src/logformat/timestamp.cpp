@@ -1,6 +1,5 @@
-#include "analytics/timestamp.h"
+#include "logformat/timestamp.h"
 
-#include "platform/platform.h"
 
 namespace orvane {
 namespace {
@@ -78,10 +77,7 @@ std::string FormatTimestampAt(std::int64_t seconds) {
   return text;
 }
 
-std::string FormatTimestamp() { return FormatTimestampAt(platform::calls().now_seconds()); }
-
-std::string_view TimestampCache::Now() {
-  const std::int64_t now = platform::calls().now_seconds();
+std::string_view TimestampCache::At(std::int64_t now) {
   if (now != seconds) {
     FormatTimestampInto(text, now);
     seconds = now;

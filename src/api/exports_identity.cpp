@@ -1,8 +1,8 @@
 // Exports of the launch identity.
 #include "OrvaneSDK.h"
 #include "identity/command_line.h"
-#include "sdk/empty_text.h"
-#include "sdk/export_guard.h"
+#include "core/empty_text.h"
+#include "api/export_guard.h"
 
 #include <cstdlib>
 

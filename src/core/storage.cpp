@@ -1,4 +1,4 @@
-#include "sdk/storage.h"
+#include "core/storage.h"
 
 #include <atomic>
 

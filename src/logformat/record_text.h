@@ -20,8 +20,4 @@ void AppendJsonEscaped(std::string &out, std::string_view value);
 void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,
                        std::string_view type, std::string_view time, std::string_view extra);
 
-// The record text of one event, stamped with the current UTC time.
-std::string ComposeEventRecord(std::string_view game_id, std::string_view user_id,
-                               std::string_view type, std::string_view extra);
-
 } // namespace orvane

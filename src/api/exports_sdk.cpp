@@ -1,7 +1,7 @@
 // Exports of the SDK surface: the log channel and initialisation.
 #include "OrvaneSDK.h"
-#include "sdk/export_guard.h"
-#include "sdk/storage.h"
+#include "api/export_guard.h"
+#include "core/storage.h"
 
 extern "C" {
 

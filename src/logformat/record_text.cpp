@@ -1,6 +1,4 @@
-#include "analytics/record_text.h"
-
-#include "analytics/timestamp.h"
+#include "logformat/record_text.h"
 
 #include <cstdint>
 #include <cstring>
@@ -120,13 +118,6 @@ void AppendEventRecord(std::string &out, std::string_view game_id, std::string_v
   char *p = out.data() + start;
   for (int k = 0; k < 5; ++k) p = Put(Put(p, kMemberPrefix[k]), values[k]);
   Put(p, kRecordEnd);
-}
-
-std::string ComposeEventRecord(std::string_view game_id, std::string_view user_id,
-                               std::string_view type, std::string_view extra) {
-  std::string record;
-  AppendEventRecord(record, game_id, user_id, type, FormatTimestamp(), extra);
-  return record;
 }
 
 } // namespace orvane
