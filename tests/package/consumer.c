@@ -35,8 +35,10 @@ static int run(void) {
   put("oGetVersion() = ");
   put(oGetVersion());
   put("\n");
-  if (!same(oGetVersion(), ORVANE_SDK_VERSION_STRING) || !same(oGetVersion(), ORVANE_EXPECTED_VERSION))
-    return put("version differs from " ORVANE_SDK_VERSION_STRING " or " ORVANE_EXPECTED_VERSION "\n"), 1;
+  if (!same(oGetVersion(), ORVANE_SDK_VERSION_STRING) || !same(oGetVersion(), ORVANE_EXPECTED_VERSION)) {
+    put("differs from the header's " ORVANE_SDK_VERSION_STRING " or the package's " ORVANE_EXPECTED_VERSION "\n");
+    return 1;
+  }
   return oAnalyticsGameEnter("consumer", "u1") != 0;
 }
 

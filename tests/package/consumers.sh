@@ -66,6 +66,7 @@ step c cmake --build c
 cp "$windows/bin/OrvaneSDK.dll" c/
 under_wine c c/consumer.exe "c (mingw-w64, find_package, wine)"
 
+# kernel32 comes from mingw-w64's import library, which lld-link reads too.
 mkdir d && cp "$windows/bin/OrvaneSDK.dll" d/
 step d clang --target=x86_64-pc-windows-msvc -ffreestanding $warnings -I"$windows/include" \
   -DORVANE_EXPECTED_VERSION="\"$version\"" -c "$here/consumer.c" -o d/consumer.obj
