@@ -1,11 +1,12 @@
 # OrvaneSDK.def and the MSVC import library OrvaneSDK.lib of the mingw DLL.
 #
 # The linker writes the .def from the DLL's actual export table, so it never
-# drifts from the exports. llvm-dlltool turns it into OrvaneSDK.lib in the
-# short import format that Microsoft's lib.exe writes (it is LLVM's lib.exe
-# counterpart, shared with llvm-lib and lld-link): link.exe and lld-link read
-# it as one of their own. GNU dlltool would write the long mingw format, the
-# same content as libOrvaneSDK.dll.a, which MSVC tools only partly support.
+# drifts from the exports. llvm-dlltool (Debian's llvm) turns it into
+# OrvaneSDK.lib in the short import format that Microsoft's lib.exe writes,
+# with the same code as llvm-lib and lld-link: link.exe reads it as one of its
+# own. GNU dlltool would write binutils' older format (import tables put
+# together from small objects, like libOrvaneSDK.dll.a), which link.exe reads
+# in simple cases only.
 find_program(ORVANE_LLVM_DLLTOOL NAMES llvm-dlltool llvm-dlltool-14 REQUIRED)
 set(ORVANE_DEF_FILE ${CMAKE_CURRENT_BINARY_DIR}/OrvaneSDK.def)
 set(ORVANE_MSVC_IMPORT_LIBRARY ${CMAKE_CURRENT_BINARY_DIR}/OrvaneSDK.lib)
