@@ -32,6 +32,8 @@
 
 #include <stdint.h>
 
+#include "OrvaneSDKVersion.h"
+
 #if defined(_WIN32)
 #  define ORVANE_CALL __cdecl
 #  if defined(ORVANE_BUILDING_LIBRARY)
@@ -169,6 +171,14 @@ ORVANE_API char *ORVANE_CALL oAuthGetGameId(void);
  * runtime; a host on that same runtime may still free() it.)
  */
 ORVANE_API void ORVANE_CALL oFreeText(char *text);
+
+/*
+ * The version of the loaded library, "MAJOR.MINOR.PATCH", for a host that
+ * checks it against ORVANE_SDK_VERSION_STRING of the headers it was built
+ * with (same MAJOR: compatible). A constant text: never free it. Sends no
+ * message; any thread.
+ */
+ORVANE_API const char *ORVANE_CALL oGetVersion(void);
 
 #ifdef __cplusplus
 } /* extern "C" */

@@ -1,9 +1,11 @@
 #!/usr/bin/env bash
 # The whole test run, as CI does it: the Linux build with warnings as errors,
 # its tests plain, under AddressSanitizer + UBSan and under ThreadSanitizer,
-# the Windows DLL under wine, then each fuzzer for a bounded time.
+# the Windows DLL under wine, the release archives with game builds against
+# them, then each fuzzer for a bounded time.
 #   scripts/test.sh            everything
 #   scripts/test.sh quick      the Linux build and its tests only
+#   scripts/test.sh package    the release archives and the game builds only
 set -euo pipefail
 cd "$(dirname "$0")/.."
 mode="${1:-all}"
@@ -12,6 +14,17 @@ jobs=2
 step() { printf '\n==== %s ====\n' "$*"; }
 
 if [ "$mode" = quick ]; then scripts/install-deps.sh linux; else scripts/install-deps.sh all; fi
+
+package_leg() {
+  step "Release archives (scripts/release.sh)"
+  scripts/release.sh
+  step "Package: games built against the archives (find_package, pkg-config, mingw, MSVC ABI)"
+  bash tests/package/consumers.sh build/release build/package
+}
+if [ "$mode" = package ]; then
+  package_leg
+  exit 0
+fi
 
 step "Linux build (warnings are errors)"
 cmake --preset ci >/dev/null
@@ -35,6 +48,8 @@ if [ -x scripts/ci-windows.sh ]; then
   step "Windows DLL under wine"
   scripts/ci-windows.sh
 fi
+
+package_leg
 
 if [ -x scripts/fuzz.sh ]; then
   step "Fuzzers"

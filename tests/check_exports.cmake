@@ -1,12 +1,11 @@
-# Fails unless the library's dynamic symbol table defines exactly the nine
-# exported functions.
+# Fails unless the library's dynamic symbol table defines exactly its exports.
 execute_process(COMMAND nm -D --defined-only ${LIBRARY}
   OUTPUT_VARIABLE table RESULT_VARIABLE failed)
 if(failed)
   message(FATAL_ERROR "nm could not read ${LIBRARY}")
 endif()
 set(expected oAnalyticsGameEnter oAnalyticsGameExit oAnalyticsInit oAnalyticsSpecial
-  oAuthGetGameId oAuthGetUserUuid oFreeText oInitialize oRegisterForLogs)
+  oAuthGetGameId oAuthGetUserUuid oFreeText oGetVersion oInitialize oRegisterForLogs)
 string(REGEX MATCHALL "[0-9a-f]+ [TtWwDdBbRrVviu] [^\n]+" rows "${table}")
 set(found "")
 foreach(row IN LISTS rows)

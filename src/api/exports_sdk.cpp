@@ -1,4 +1,4 @@
-// Exports of the SDK surface: the log channel and initialisation.
+// Exports of the SDK surface: the log channel, initialisation and the version.
 #include "OrvaneSDK.h"
 #include "api/export_guard.h"
 #include "core/storage.h"
@@ -16,5 +16,7 @@ ORVANE_API void ORVANE_CALL oInitialize(void) {
     return 0;
   });
 }
+
+ORVANE_API const char *ORVANE_CALL oGetVersion(void) { return ORVANE_SDK_VERSION_STRING; }
 
 } // extern "C"

@@ -1,6 +1,7 @@
 // The record cipher: AES-256-CBC with PKCS#7 padding, one record at a time,
-// every record from the same IV. One backend per build (OpenSSL or Windows
-// CNG) fills the table; both give the same bytes.
+// every record from the same IV. This folder owns the cipher interface and
+// its backends; the build picks one by name (OpenSSL or Windows CNG), and
+// both give the same bytes.
 #pragma once
 
 #include <cstddef>
@@ -19,6 +20,7 @@ constexpr std::size_t CiphertextSize(std::size_t size) { return (size / kBlockSi
 struct Session;
 
 struct Backend {
+  const char *name; // "openssl", "cng": what the build chose, for reports
   // Null on failure, after printing the reason to standard error.
   Session *(*open)(const std::uint8_t *key, const std::uint8_t *iv);
   void (*close)(Session *session);

@@ -113,7 +113,7 @@ std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
   return first + second;
 }
 
-const Backend kOpenSsl = {OpenOpenSsl, CloseOpenSsl, EncryptOpenSsl, DecryptOpenSsl};
+const Backend kOpenSsl = {"openssl", OpenOpenSsl, CloseOpenSsl, EncryptOpenSsl, DecryptOpenSsl};
 Backend g_backend = kOpenSsl;
 
 } // namespace

@@ -1,8 +1,9 @@
-# Fails unless the DLL's export table holds exactly the nine functions under
-# their plain names and its import table names only system DLLs, so that a
-# game ships OrvaneSDK.dll alone: no libstdc++, libgcc or winpthread DLL.
+# Fails unless the DLL's export table holds exactly the exports under their
+# plain names, its import table names only system DLLs, so that a game ships OrvaneSDK.dll alone: no libstdc++, libgcc or
+# winpthread DLL, and its version resource carries VERSION.
 #
-#   cmake -DOBJDUMP=... -DLIBRARY=OrvaneSDK.dll -DIMPORTS="a.dll;b.dll" -P check_dll_tables.cmake
+#   cmake -DOBJDUMP=... -DWINDRES=... -DLIBRARY=OrvaneSDK.dll -DIMPORTS="a.dll;b.dll"
+#         -DVERSION=1.2.3 -P check_dll_tables.cmake
 execute_process(COMMAND ${OBJDUMP} -p ${LIBRARY}
   OUTPUT_VARIABLE table RESULT_VARIABLE failed)
 if(failed)
@@ -18,7 +19,7 @@ string(STRIP "${names}" names)
 string(REPLACE "\n" ";" exports "${names}")
 list(SORT exports)
 set(expected oAnalyticsGameEnter oAnalyticsGameExit oAnalyticsInit oAnalyticsSpecial
-  oAuthGetGameId oAuthGetUserUuid oFreeText oInitialize oRegisterForLogs)
+  oAuthGetGameId oAuthGetUserUuid oFreeText oGetVersion oInitialize oRegisterForLogs)
 if(NOT exports STREQUAL expected)
   message(FATAL_ERROR "exports differ\n  expected: ${expected}\n  found:    ${exports}")
 endif()
@@ -36,5 +37,16 @@ list(SORT allowed)
 if(NOT imports STREQUAL allowed)
   message(FATAL_ERROR "imports differ\n  expected: ${allowed}\n  found:    ${imports}")
 endif()
+# The version resource, as windres decompiles it from the DLL.
+execute_process(COMMAND ${WINDRES} -i ${LIBRARY} -O rc OUTPUT_VARIABLE resource)
+string(REPLACE "." ", " numbers "${VERSION}")
+foreach(line "FILEVERSION ${numbers}, 0" "PRODUCTVERSION ${numbers}, 0"
+    "\"FileVersion\", \"${VERSION}\"" "\"ProductVersion\", \"${VERSION}\""
+    "\"ProductName\", \"OrvaneSDK\"" "\"FileDescription\", \"OrvaneSDK: ")
+  string(FIND "${resource}" "${line}" at)
+  if(at EQUAL -1)
+    message(FATAL_ERROR "version resource lacks ${line}:\n${resource}")
+  endif()
+endforeach()
 message(STATUS "exports: ${exports}")
 message(STATUS "imports: ${imports}")

@@ -24,6 +24,7 @@
 
 namespace {
 
+using namespace orvane;
 using namespace orvane::logcat;
 namespace fs = std::filesystem;
 

@@ -2,6 +2,8 @@
 
 #include "help_text.h"
 
+#include "OrvaneSDKVersion.h"
+
 #include <cstdio>
 #include <cstdlib>
 #include <string_view>
@@ -58,7 +60,7 @@ std::optional<Options> ParseOptions(int argc, char **argv) {
       std::fwrite(kHelpText.data(), 1, kHelpText.size(), stdout);
       std::exit(0);
     } else if (arg == "--version") {
-      std::printf("orvane-logcat %s\n", ORVANE_LOGCAT_VERSION);
+      std::printf("orvane-logcat %s\n", ORVANE_SDK_VERSION_STRING);
       std::exit(0);
     } else if (arg == "--check") {
       options.check = true;

@@ -1,0 +1,77 @@
+# What `cmake --install` puts down and the release archives hold.
+#
+# Component `sdk`: everything a game team builds and ships with. Component
+# `symbols`: the .debug files (cmake/debug_info.cmake), beside the binaries
+# they belong to, kept out of the sdk archive.
+#
+#   Windows (ZIP)                          Linux (TGZ)
+#   bin/OrvaneSDK.dll                      lib/libOrvaneSDK.so.1.0.0, .so.1, .so
+#   bin/orvane-logcat.exe                  bin/orvane-logcat
+#   lib/OrvaneSDK.lib, OrvaneSDK.def       lib/pkgconfig/orvanesdk.pc
+#   lib/libOrvaneSDK.dll.a                 lib/cmake/OrvaneSDK/
+#   lib/pkgconfig/orvanesdk.pc             include/OrvaneSDK.h, OrvaneSDKVersion.h
+#   lib/cmake/OrvaneSDK/                   share/doc/OrvaneSDK/LICENSE, CHANGELOG.md, README.md
+#   include/OrvaneSDK.h, OrvaneSDKVersion.h
+#   LICENSE, CHANGELOG.md, README.md, bindings/csharp/
+include(CMakePackageConfigHelpers)
+set(cmake_dir ${CMAKE_INSTALL_LIBDIR}/cmake/OrvaneSDK)
+
+install(TARGETS OrvaneSDK EXPORT OrvaneSDKTargets
+  RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT sdk
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT sdk
+  ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT sdk)
+if(TARGET orvane-logcat)
+  install(TARGETS orvane-logcat RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT sdk)
+endif()
+install(FILES include/OrvaneSDK.h ${PROJECT_BINARY_DIR}/include/OrvaneSDKVersion.h
+  DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT sdk)
+
+# CMake package: OrvaneSDK::OrvaneSDK, compatible within one major version.
+install(EXPORT OrvaneSDKTargets NAMESPACE OrvaneSDK:: DESTINATION ${cmake_dir} COMPONENT sdk)
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/OrvaneSDKConfigVersion.cmake
+  COMPATIBILITY SameMajorVersion)
+install(FILES cmake/OrvaneSDKConfig.cmake ${PROJECT_BINARY_DIR}/OrvaneSDKConfigVersion.cmake
+  DESTINATION ${cmake_dir} COMPONENT sdk)
+
+# pkg-config, relocatable with the tree it lies in.
+file(RELATIVE_PATH ORVANE_PC_PREFIX ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
+string(REGEX REPLACE "/$" "" ORVANE_PC_PREFIX "${ORVANE_PC_PREFIX}")
+configure_file(cmake/orvanesdk.pc.in ${PROJECT_BINARY_DIR}/orvanesdk.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/orvanesdk.pc
+  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT sdk)
+
+# Documents at the top of a Windows archive, in share/doc on Linux.
+if(WIN32)
+  set(doc_dir .)
+  set(binding_dir bindings)
+else()
+  set(doc_dir ${CMAKE_INSTALL_DOCDIR})
+  set(binding_dir ${CMAKE_INSTALL_DATADIR}/OrvaneSDK/bindings)
+endif()
+install(FILES LICENSE CHANGELOG.md README.md DESTINATION ${doc_dir} COMPONENT sdk)
+if(EXISTS ${PROJECT_SOURCE_DIR}/bindings/csharp)
+  install(DIRECTORY bindings/csharp DESTINATION ${binding_dir} COMPONENT sdk)
+endif()
+
+# Release archives: one with the sdk component, one with the symbols.
+if(PROJECT_IS_TOP_LEVEL)
+  set(CPACK_PACKAGE_NAME OrvaneSDK)
+  set(CPACK_PACKAGE_VENDOR "the OrvaneSDK authors")
+  set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "Analytics event log and launch identity for games")
+  set(CPACK_RESOURCE_FILE_LICENSE ${PROJECT_SOURCE_DIR}/LICENSE)
+  if(WIN32)
+    set(CPACK_GENERATOR ZIP)
+    set(CPACK_SYSTEM_NAME windows-x64)
+  else()
+    set(CPACK_GENERATOR TGZ)
+    set(CPACK_SYSTEM_NAME linux-${CMAKE_SYSTEM_PROCESSOR})
+  endif()
+  set(CPACK_PACKAGE_FILE_NAME OrvaneSDK-${PROJECT_VERSION}-${CPACK_SYSTEM_NAME})
+  set(CPACK_ARCHIVE_COMPONENT_INSTALL ON)
+  set(CPACK_COMPONENTS_ALL sdk symbols)
+  set(CPACK_ARCHIVE_SDK_FILE_NAME ${CPACK_PACKAGE_FILE_NAME})
+  set(CPACK_ARCHIVE_SYMBOLS_FILE_NAME ${CPACK_PACKAGE_FILE_NAME}-symbols)
+  set(CPACK_COMPONENT_INCLUDE_TOPLEVEL_DIRECTORY ON)
+  set(CPACK_VERBATIM_VARIABLES ON)
+  include(CPack)
+endif()
