@@ -1,6 +1,5 @@
 #include "support/test_support.h"
 
-#include "core/log_channel.h"
 #include "core/storage.h"
 
 #include <openssl/evp.h>
@@ -8,6 +7,7 @@
 #include <filesystem>
 #include <fstream>
 #include <random>
+#include <regex>
 #include <sstream>
 
 namespace orvane::testing {
@@ -27,20 +27,15 @@ void ORVANE_CALL CaptureMessage(LogLevel level, const char *message) {
 
 std::string MakeTempDirectory() {
   static std::random_device entropy;
-  const std::filesystem::path base = std::filesystem::temp_directory_path();
   for (;;) {
-    const std::filesystem::path candidate =
-        base / ("orvane-test-" + std::to_string(entropy()) + std::to_string(entropy()));
-    std::error_code error;
-    if (std::filesystem::create_directory(candidate, error)) return candidate.string();
+    const auto candidate = std::filesystem::temp_directory_path() / ("orvane-test-" + std::to_string(entropy()));
+    if (std::filesystem::create_directory(candidate)) return candidate.string();
   }
 }
 
 void RemoveTree(const std::string &path) {
-  std::error_code error;
-  std::filesystem::permissions(path, std::filesystem::perms::owner_all,
-                               std::filesystem::perm_options::add, error);
-  std::filesystem::remove_all(path, error);
+  std::error_code ignored;
+  std::filesystem::remove_all(path, ignored);
 }
 
 std::optional<std::string> ReadFile(const std::string &path) {
@@ -52,105 +47,71 @@ std::optional<std::string> ReadFile(const std::string &path) {
 }
 
 void WriteFile(const std::string &path, std::string_view bytes) {
-  std::ofstream out(path, std::ios::binary | std::ios::trunc);
-  out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
+  std::ofstream(path, std::ios::binary).write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
 }
 
-bool IsDirectory(const std::string &path) {
-  std::error_code error;
-  return std::filesystem::is_directory(path, error);
-}
-
-bool Exists(const std::string &path) {
-  std::error_code error;
-  return std::filesystem::exists(std::filesystem::symlink_status(path, error));
-}
-
-std::vector<std::string> SplitLines(std::string_view text) {
-  std::vector<std::string> lines;
-  std::size_t start = 0;
-  for (;;) {
-    std::size_t end = text.find('\n', start);
-    if (end == std::string_view::npos) {
-      lines.emplace_back(text.substr(start));
-      return lines;
-    }
-    lines.emplace_back(text.substr(start, end - start));
-    start = end + 1;
-  }
-}
-
-std::vector<std::string> SplitLogLines(std::string_view text) {
-  const std::string_view separator = platform::line_break();
-  std::vector<std::string> lines;
-  std::size_t start = 0;
-  for (;;) {
+std::vector<std::string> Split(std::string_view text, std::string_view separator) {
+  std::vector<std::string> parts;
+  for (std::size_t start = 0;;) {
     const std::size_t end = text.find(separator, start);
-    if (end == std::string_view::npos) {
-      lines.emplace_back(text.substr(start));
-      return lines;
-    }
-    lines.emplace_back(text.substr(start, end - start));
+    parts.emplace_back(text.substr(start, end - start));
+    if (end == std::string_view::npos) return parts;
     start = end + separator.size();
   }
 }
 
-std::string KeyTextFor(std::string_view key_game_id) {
+std::string KeyTextFor(std::string_view game_id) {
   std::string key = "OrvaneLogKey-01";
-  key += key_game_id.substr(0, 65);
+  key += game_id.substr(0, 65);
   key.resize(80, '\0');
   return key;
 }
 
 std::optional<std::string> DecryptLine(std::string_view hex, std::string_view key_text) {
-  if (hex.size() % 2 != 0 || key_text.size() != 80) return std::nullopt;
   std::string bytes;
-  for (std::size_t i = 0; i < hex.size(); i += 2) {
-    auto nibble = [](char c) -> int {
-      if (c >= '0' && c <= '9') return c - '0';
-      if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-      return -1;
-    };
-    int high = nibble(hex[i]), low = nibble(hex[i + 1]);
-    if (high < 0 || low < 0) return std::nullopt;
-    bytes.push_back(static_cast<char>(high * 16 + low));
+  for (std::size_t i = 0; i + 1 < hex.size() + (hex.size() % 2); i += 2) {
+    const std::string pair(hex.substr(i, 2));
+    if (pair.size() != 2 || pair.find_first_not_of("0123456789abcdef") != std::string::npos) return std::nullopt;
+    bytes.push_back(static_cast<char>(std::stoi(pair, nullptr, 16)));
   }
   const auto *key = reinterpret_cast<const unsigned char *>(key_text.data());
   std::string plain(bytes.size() + 16, '\0');
-  EVP_CIPHER_CTX *ctx = EVP_CIPHER_CTX_new();
+  auto *out = reinterpret_cast<unsigned char *>(plain.data());
   int first = 0, second = 0;
-  bool ok = EVP_DecryptInit_ex(ctx, EVP_aes_256_cbc(), nullptr, key, key + 64) == 1 &&
-            EVP_DecryptUpdate(ctx, reinterpret_cast<unsigned char *>(plain.data()), &first,
-                              reinterpret_cast<const unsigned char *>(bytes.data()),
-                              static_cast<int>(bytes.size())) == 1 &&
-            EVP_DecryptFinal_ex(ctx, reinterpret_cast<unsigned char *>(plain.data()) + first,
-                                &second) == 1;
+  EVP_CIPHER_CTX *ctx = EVP_CIPHER_CTX_new();
+  const bool ok = key_text.size() == 80 && EVP_DecryptInit_ex(ctx, EVP_aes_256_cbc(), nullptr, key, key + 64) == 1 &&
+                  EVP_DecryptUpdate(ctx, out, &first, reinterpret_cast<const unsigned char *>(bytes.data()),
+                                    static_cast<int>(bytes.size())) == 1 &&
+                  EVP_DecryptFinal_ex(ctx, out + first, &second) == 1;
   EVP_CIPHER_CTX_free(ctx);
   if (!ok) return std::nullopt;
   plain.resize(static_cast<std::size_t>(first + second));
   return plain;
 }
 
+std::vector<std::string> Records(const std::string &log, const std::string &key_text) {
+  static const std::regex time(R"("time":"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d")");
+  std::vector<std::string> records;
+  const std::string content = ReadFile(log).value_or("");
+  if (content.empty()) return records;
+  for (const std::string &line : Split(content, platform::line_break())) {
+    const std::optional<std::string> plain = DecryptLine(line, key_text);
+    records.push_back(plain ? std::regex_replace(*plain, time, "\"time\":\"T\"") : "(undecryptable)");
+  }
+  return records;
+}
+
 void SandboxTest::SetUp() {
   base_ = MakeTempDirectory();
-  where_.base = base_ + "/share";
-  where_.root = where_.base + "/Orvane/";
-  where_.logs = where_.root + "Logs/";
+  where_ = {base_ + "/share", base_ + "/share/Orvane/", base_ + "/share/Orvane/Logs/"};
   SetStorageForTesting(where_);
-  platform::calls() = platform::native_calls();
-  Captured().clear();
-  RegisterForLogs(CaptureMessage);
+  oRegisterForLogs(CaptureMessage);
   Captured().clear();
 }
 
 void SandboxTest::TearDown() {
-  RegisterForLogs(nullptr);
-  platform::calls() = platform::native_calls();
+  oRegisterForLogs(nullptr);
   RemoveTree(base_);
-}
-
-std::string SandboxTest::LogPath(std::string_view game_id) const {
-  return where_.logs + std::string(game_id) + ".log";
 }
 
 } // namespace orvane::testing

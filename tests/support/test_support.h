@@ -1,17 +1,19 @@
-// Shared helpers of the tests: a private data directory per test, captured
-// host messages, file reading and an independent decryption of log lines.
+// What the tests share: a private data directory per test, the host's
+// messages, files, a guard for swapped calls, the one independent decryption
+// of log lines, and a child process.
 #pragma once
 
 #include "OrvaneSDK.h"
+#include "cipher/cipher.h"
 #include "platform/platform.h"
 
 #include <gtest/gtest.h>
 
-#include <cstdint>
 #include <optional>
 #include <ostream>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace orvane::testing {
@@ -22,8 +24,6 @@ struct Message {
   bool operator==(const Message &) const = default;
 };
 std::ostream &operator<<(std::ostream &out, const Message &message);
-
-// What the capturing callback has received since the last Clear.
 std::vector<Message> &Captured();
 void ORVANE_CALL CaptureMessage(LogLevel level, const char *message);
 
@@ -31,34 +31,50 @@ std::string MakeTempDirectory();
 void RemoveTree(const std::string &path);
 std::optional<std::string> ReadFile(const std::string &path);
 void WriteFile(const std::string &path, std::string_view bytes);
-bool IsDirectory(const std::string &path);
-bool Exists(const std::string &path);
+// "a\nb" gives {a, b}; "" gives {""}.
+std::vector<std::string> Split(std::string_view text, std::string_view separator);
 
-// Splits on "\n" exactly: "a\nb" gives {a, b}, "" gives {""}.
-std::vector<std::string> SplitLines(std::string_view text);
-// Splits a log file on this platform's line break (CR LF on Windows); a lone
-// line feed stays inside its line.
-std::vector<std::string> SplitLogLines(std::string_view text);
-
-// The 80-byte key text for `key_game_id`, built here from the log format's
-// rule rather than by the library: "OrvaneLogKey-01" + first 65 bytes.
-std::string KeyTextFor(std::string_view key_game_id);
-
-// Decrypts one hex line with OpenSSL directly (a fresh EVP context, not the
-// library's cipher code). Empty when the line is not valid hex or the
-// padding is wrong.
+// The key text of `game_id` built here, not by the library: the fixed text,
+// the first 65 bytes of the id, zeros to 80 bytes.
+std::string KeyTextFor(std::string_view game_id);
+// One hex line decrypted by OpenSSL's EVP calls directly (answered by CNG on
+// Windows), not by the library's cipher code; nullopt when it does not.
 std::optional<std::string> DecryptLine(std::string_view hex, std::string_view key_text);
+// The lines of a log (platform line breaks), each decrypted with its time
+// stamp replaced by "T", or "(undecryptable)"; none for a missing or empty log.
+std::vector<std::string> Records(const std::string &log, const std::string &key_text);
 
-// Gives each test an empty data directory, a capturing callback, and the
-// platform's own calls back afterwards.
+// Gives back the platform table and the cipher backend as they were, so
+// that no fake outlives its test, a failed ASSERT included.
+struct CallsGuard {
+  platform::Calls calls = platform::calls();
+  cipher::Backend backend = cipher::backend();
+  ~CallsGuard() {
+    platform::calls() = calls;
+    cipher::backend() = backend;
+  }
+};
+
+// An empty data directory and a capturing callback for each test.
 class SandboxTest : public ::testing::Test {
 protected:
   void SetUp() override;
   void TearDown() override;
-  std::string LogPath(std::string_view game_id) const;
+  std::string LogPath(std::string_view game_id) const { return where_.logs + std::string(game_id) + ".log"; }
 
+  CallsGuard guard_;
   std::string base_; // stands where the drive root or ~/.local/share would
   platform::StorageLocation where_;
 };
+
+struct ChildResult {
+  int exit_code = -1;  // -1 when it did not run or exit normally
+  std::string output;  // standard output and error, interleaved
+};
+// Runs `program` with `args` (args[0] is the child's argument 0) and the
+// environment plus `env`; kills it after `timeout_seconds`.
+ChildResult RunChild(const std::string &program, const std::vector<std::string> &args,
+                     const std::vector<std::pair<std::string, std::string>> &env = {},
+                     int timeout_seconds = 30);
 
 } // namespace orvane::testing
