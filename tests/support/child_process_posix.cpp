@@ -16,8 +16,8 @@ namespace orvane::testing {
 ChildResult RunChild(const std::string &program, const std::vector<std::string> &args,
                      const std::vector<std::pair<std::string, std::string>> &env, int timeout_seconds) {
   std::vector<std::string> texts;
+  for (const auto &[name, value] : env) texts.push_back(name + "=" + value); // the first one counts
   for (char **e = environ; *e; ++e) texts.emplace_back(*e);
-  for (const auto &[name, value] : env) texts.push_back(name + "=" + value); // the last one counts
   texts.insert(texts.end(), args.begin(), args.end());
   std::vector<char *> envp, argv;
   for (std::size_t i = 0; i < texts.size(); ++i) (i < texts.size() - args.size() ? envp : argv).push_back(texts[i].data());
