@@ -4,6 +4,7 @@
 #
 #   cmake -DPACKAGE=dir -DBINDING=OrvaneSDK.cs -DLIBRARY=lib -DVERSION=x.y.z -P check_unity_package.cmake
 get_filename_component(library_name ${LIBRARY} NAME)
+string(REGEX REPLACE "\\.so\\..*$" ".so" library_name "${library_name}") # Unity loads the unversioned name
 file(GLOB_RECURSE files RELATIVE ${PACKAGE} ${PACKAGE}/*)
 list(SORT files)
 set(expected Plugins/x86_64/${library_name} Runtime/Orvane.SDK.asmdef Runtime/OrvaneSDK.cs package.json)

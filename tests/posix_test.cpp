@@ -52,7 +52,7 @@ TEST_F(PosixTest, OnlyARegularFileIsALog) {
                                                                 "to open. Maybe a bad game_id (") + game + ")?"}}));
   }
   EXPECT_EQ(ReadFile(outside), "kept");
-  EXPECT_FALSE(Exists(base_ + "/planted"));
+  EXPECT_FALSE(std::filesystem::exists(base_ + "/planted"));
 }
 
 TEST_F(PosixTest, ALineThatDoesNotFitIsAnErrorNotOk) {

@@ -1,6 +1,6 @@
 // orvane-logcat as QA and the back end run it, on folders that processes of
 // the sample host wrote; records checked against an independent decryption.
-#include "support/child_process.h"
+#include "support/test_support.h"
 #include "support/test_support.h"
 
 #include <gtest/gtest.h>
@@ -10,6 +10,8 @@
 
 namespace orvane::testing {
 namespace {
+
+std::vector<std::string> SplitLines(std::string_view text) { return Split(text, "\n"); }
 
 struct Output { int exit_code = -1; std::string out, err; };
 

@@ -1,11 +1,13 @@
-// The host log channel: who hears which message, after which registration.
+// Core services: the host log channel (who hears which message, after which
+// registration) and the storage directories.
 #include "OrvaneSDK.h"
 #include "core/log_channel.h"
+#include "core/storage.h"
 #include "support/test_support.h"
 
 #include <atomic>
 #include <chrono>
-#include <cstdlib>
+#include <filesystem>
 #include <string>
 #include <thread>
 #include <vector>
@@ -82,22 +84,6 @@ TEST(LogChannel, BatchDeliversInOrderAfterTheWork) {
   oRegisterForLogs(nullptr);
 }
 
-// A callback may call back into the library: no lock is held while it runs.
-int g_reentered = 0;
-void ORVANE_CALL Reenter(LogLevel, const char *message) {
-  if (std::string(message) == "[OrvaneSDK] Logging initiated." && g_reentered++ == 0) {
-    char *id = oAuthGetGameId(); // touches nothing on disk
-    if (id[0] != '\0') std::free(id);
-  }
-}
-
-TEST(LogChannel, CallbackMayCallTheLibrary) {
-  g_reentered = 0;
-  oRegisterForLogs(Reenter);
-  oRegisterForLogs(nullptr);
-  EXPECT_EQ(g_reentered, 1);
-}
-
 // Withdrawing a callback waits for its calls on other threads: this one is
 // still running when the unregistering thread arrives, and has returned
 // when oRegisterForLogs does.
@@ -130,6 +116,35 @@ TEST(LogChannel, CallbackMayWithdrawItself) {
   oRegisterForLogs(WithdrawSelf);
   LogToHost(LogLevel::Info, kNote);
   EXPECT_EQ(g_withdrawn, 1);
+}
+
+// oInitialize creates what is missing, the root before the logs, and says
+// what the disk shows afterwards.
+std::vector<std::string> g_created;
+bool RecordingMakeDirectory(const char *path) {
+  g_created.push_back(path);
+  return platform::native_calls().make_directory(path);
+}
+
+TEST_F(SandboxTest, InitializeCreatesWhatIsMissingRootFirst) {
+  platform::calls().make_directory = RecordingMakeDirectory;
+  const Message ok{0, "[OrvaneSDK] Initialize() - OK."}, failed{2, "[OrvaneSDK] Initialize() - failed."};
+  const std::string root = where_.root, logs = where_.logs;
+  const struct {
+    std::vector<std::string> before, created;
+    Message message;
+  } cases[] = {
+      {{}, {root, logs}, ok}, {{root}, {logs}, ok}, {{logs}, {}, ok}, {{root, "file"}, {logs}, failed}};
+  for (const auto &c : cases) {
+    RemoveTree(where_.base);
+    for (const std::string &dir : c.before)
+      dir == "file" ? WriteFile(root + "Logs", "in the way") : (void)std::filesystem::create_directories(dir);
+    g_created.clear();
+    Captured().clear();
+    oInitialize();
+    EXPECT_EQ(g_created, c.created);
+    EXPECT_EQ(Captured(), std::vector<Message>{c.message});
+  }
 }
 
 } // namespace

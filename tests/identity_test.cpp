@@ -1,9 +1,9 @@
-// The identity lookup over argument lists given as 16-bit units.
+// The launch identity: the lookup over argument lists of 16-bit units, and
+// the two exports over a given list.
 #include "OrvaneSDK.h"
 #include "identity/command_line.h"
 #include "support/test_support.h"
 
-#include <cstdlib>
 #include <string>
 
 namespace orvane::testing {
@@ -63,86 +63,40 @@ bool FakeArguments(platform::ArgumentList &args) {
   return g_split_ok;
 }
 
-class IdentityTest : public SandboxTest {
-protected:
-  void SetUp() override {
-    SandboxTest::SetUp();
-    platform::calls().argument_list = FakeArguments;
-    g_split_ok = true;
-  }
-};
-
-TEST_F(IdentityTest, ResultsAndMessages) {
+// Results and messages of the two exports over a given argument list; every
+// result goes back through oFreeText, the constant empty text too.
+TEST_F(SandboxTest, IdentityResultsAndMessages) {
+  platform::calls().argument_list = FakeArguments;
   struct Case {
-    const char *name;
     platform::ArgumentList args;
     bool split_ok;
     std::string uuid; // empty: the constant empty text
     std::string game_id;
     std::vector<Message> messages;
   };
-  const Message uuid_ok{0, "[OrvaneSDK] Authentication - OK"};
-  const Message uuid_failed{2, "[OrvaneSDK] Authentication - Failed"};
-  const Message game_ok{0, "[OrvaneSDK] Return GameID - OK"};
-  const Message game_empty{2, "[OrvaneSDK] Return GameID - Empty"};
+  const Message uuid_ok{0, "[OrvaneSDK] Authentication - OK"}, uuid_failed{2, "[OrvaneSDK] Authentication - Failed"};
+  const Message game_ok{0, "[OrvaneSDK] Return GameID - OK"}, game_empty{2, "[OrvaneSDK] Return GameID - Empty"};
   const std::u16string exe = Units("demo.exe");
   const Case cases[] = {
-      {"both found", List({exe, Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}), true,
-       "a1b2c3d4", "demo42", {uuid_ok, game_ok}},
-      {"neither found", List({exe}), true, "", "", {uuid_failed, game_empty}},
-      {"empty values", List({exe, Units("--userUuid--"), Units("--gameId--")}), true, "", "",
-       {uuid_failed, game_empty}},
-      {"the split fails: no message", List({}), false, "", "", {}},
-      {"a value that reads empty is not found", List({exe, u"--userUuid--\u0100abc", u"--gameId--\u0000x"}),
-       true, "", "", {uuid_failed, game_empty}},
-      {"the text ends at the first zero byte", List({exe, std::u16string(u"--gameId--ab\0cd", 15)}), true, "",
-       "ab", {uuid_failed, game_ok}},
-      {"one byte", List({exe, Units("--gameId--z")}), true, "", "z", {uuid_failed, game_ok}},
+      {List({exe, Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}), true, "a1b2c3d4", "demo42",
+       {uuid_ok, game_ok, game_ok}},
+      {List({exe, Units("--userUuid--"), Units("--gameId--")}), true, "", "", {uuid_failed, game_empty, game_empty}},
+      {List({exe, Units("--gameId--z")}), false, "", "", {}}, // the split fails: no message
+      {List({exe, u"--userUuid--\u0100abc", std::u16string(u"--gameId--ab\0cd", 15)}), true, "", "ab",
+       {uuid_failed, game_ok, game_ok}}, // a value that reads empty is none; the text ends at a zero byte
   };
   for (const Case &c : cases) {
-    SCOPED_TRACE(c.name);
     g_args = c.args;
     g_split_ok = c.split_ok;
     Captured().clear();
-    char *uuid = oAuthGetUserUuid();
-    char *game = oAuthGetGameId();
-    ASSERT_NE(uuid, nullptr);
-    ASSERT_NE(game, nullptr);
+    char *uuid = oAuthGetUserUuid(), *game = oAuthGetGameId(), *again = oAuthGetGameId();
     EXPECT_EQ(std::string(uuid), c.uuid);
     EXPECT_EQ(std::string(game), c.game_id);
     EXPECT_EQ(Captured(), c.messages);
-    // Every result goes back through oFreeText, the constant empty text too.
-    oFreeText(uuid);
-    oFreeText(game);
+    EXPECT_EQ(game == again, c.game_id.empty()) << "a new block for every value, one constant for none";
+    for (char *result : {uuid, game, again}) oFreeText(result);
   }
-}
-
-TEST_F(IdentityTest, EveryCallReturnsANewBlockAndEmptyIsOneConstant) {
-  g_args = List({Units("demo.exe"), Units("--gameId--demo42")});
-  char *first = oAuthGetGameId();
-  char *second = oAuthGetGameId();
-  EXPECT_NE(first, second);
-  EXPECT_STREQ(first, "demo42");
-  EXPECT_STREQ(second, "demo42");
-  std::free(first);
-  std::free(second);
-  char *empty_a = oAuthGetUserUuid();
-  g_split_ok = false;
-  char *empty_b = oAuthGetUserUuid();
-  EXPECT_EQ(empty_a, empty_b);
-  EXPECT_EQ(empty_a[0], '\0');
-  oFreeText(empty_a); // ignored, as null is: freeing the constant would crash
   oFreeText(nullptr);
-}
-
-TEST_F(IdentityTest, SameResultsWithoutACallback) {
-  oRegisterForLogs(nullptr);
-  g_args = List({Units("demo.exe"), Units("--userUuid--u1")});
-  char *uuid = oAuthGetUserUuid();
-  EXPECT_STREQ(uuid, "u1");
-  std::free(uuid);
-  EXPECT_STREQ(oAuthGetGameId(), "");
-  EXPECT_TRUE(Captured().empty());
 }
 
 } // namespace

@@ -1,0 +1,76 @@
+// The log format, byte for byte: time stamp, record text, key text, hex.
+#include "logformat/hex.h"
+#include "logformat/key_text.h"
+#include "logformat/record_text.h"
+#include "logformat/timestamp.h"
+#include "support/test_support.h"
+
+namespace orvane::testing {
+namespace {
+
+TEST(LogFormat, TimeStampOfFixedInstants) {
+  const std::pair<std::int64_t, const char *> cases[] = {
+      {0, "1970-01-01T00:00:00"},           {1700000000, "2023-11-14T22:13:20"},
+      {1709622489, "2024-03-05T07:08:09"},  {1704067199, "2023-12-31T23:59:59"},
+      {1704067200, "2024-01-01T00:00:00"},  {951782400, "2000-02-29T00:00:00"},
+      {4107542400, "2100-03-01T00:00:00"},  {-1, "1969-12-31T23:59:59"},
+      {253402300800, "10000-01-01T00:00:00"}, // a fifth digit is kept, not cut
+  };
+  TimestampCache cache;
+  for (const auto &[seconds, text] : cases) {
+    EXPECT_EQ(FormatTimestampAt(seconds), text) << seconds;
+    EXPECT_EQ(cache.At(seconds), text) << "the cache follows the clock";
+  }
+}
+
+std::string Record(std::string_view game, std::string_view user, std::string_view type, std::string_view extra) {
+  std::string out = "kept:";
+  AppendEventRecord(out, game, user, type, "2024-05-17T08:30:00", extra);
+  return out;
+}
+
+// Values stand as they came, except what JSON forbids raw inside a string;
+// the escape scan goes by words, so escapes sit at every place in one.
+TEST(LogFormat, RecordTextWithEscapes) {
+  const std::string fixed = R"(","type":"SPECIAL","time":"2024-05-17T08:30:00","extra":")";
+  const std::pair<std::string, std::string> cases[] = {
+      {"level=3", "level=3"},
+      {"", ""},
+      {"a\"b\\c\nd\re\tf\bg\fh", "a\\\"b\\\\c\\nd\\re\\tf\\bg\\fh"},
+      {std::string("\x01\x1f\x20/\x7f\xc3\xa9\xff", 8), "\\u0001\\u001f /\x7f\xc3\xa9\xff"},
+      {"0123456\"", "0123456\\\""},
+      {"01234567\"9", "01234567\\\"9"},
+      {"0123456789abcde\x1b", "0123456789abcde\\u001b"},
+  };
+  for (const auto &[value, escaped] : cases)
+    EXPECT_EQ(Record("1234", value, "SPECIAL", value),
+              "kept:{\"user_id\":\"" + escaped + "\",\"game_id\":\"1234" + fixed + escaped + "\"}");
+  EXPECT_EQ(Record("1234", "user-42", "SPECIAL", "level=3").size(), 5u + 102u);
+}
+
+TEST(LogFormat, KeyTextTakesAtMost65BytesOfTheGameId) {
+  for (std::size_t length : {0, 16, 17, 49, 50, 65, 80}) {
+    std::string id;
+    for (std::size_t i = 0; i < length; ++i) id += static_cast<char>('A' + i % 26);
+    const KeyText text = MakeKeyText(id);
+    EXPECT_EQ(std::string(text.begin(), text.end()), KeyTextFor(id)) << length;
+  }
+}
+
+TEST(LogFormat, HexBothWays) {
+  std::uint8_t bytes[20] = {0xf0, 0x0a, 0x80, 0xff}; // a 16-byte block, then bytewise
+  for (int i = 4; i < 20; ++i) bytes[i] = static_cast<std::uint8_t>((i - 4) * 15);
+  std::string hex = "kept:";
+  AppendHex(hex, bytes, sizeof bytes);
+  EXPECT_EQ(hex, "kept:f00a80ff000f1e2d3c4b5a69788796a5b4c3d2e1");
+  std::vector<std::uint8_t> decoded;
+  ASSERT_TRUE(DecodeHex(hex.substr(5), decoded));
+  EXPECT_EQ(decoded, std::vector<std::uint8_t>(bytes, bytes + sizeof bytes));
+  for (const char *bad : {"0", "0g", "0A", "ab-1"}) {
+    EXPECT_FALSE(DecodeHex(bad, decoded)) << bad;
+    EXPECT_EQ(IsLowerHex(bad), std::string_view(bad) == "0") << bad;
+  }
+}
+
+} // namespace
+} // namespace orvane::testing
