@@ -25,7 +25,10 @@
  * first unless the calls begin with register or register-null. With no
  * calls, a short demo game session runs.
  */
+/* Only the prefixed names, as a game with its own LogLevel would include it. */
+#define ORVANE_NO_SHORT_NAMES
 #include "OrvaneSDK.h"
+typedef const char *LogLevel; /* a game's own name, no clash */
 
 #include <stdio.h>
 #include <stdlib.h>
@@ -68,7 +71,7 @@ static int own_directory(char *out, size_t size) {
 }
 #endif
 
-typedef void(ORVANE_CALL *register_fn)(LogCallback);
+typedef void(ORVANE_CALL *register_fn)(OrvaneLogCallback);
 typedef void(ORVANE_CALL *initialize_fn)(void);
 typedef int32_t(ORVANE_CALL *event_fn)(const char *, const char *);
 typedef int32_t(ORVANE_CALL *special_fn)(const char *, const char *, const char *);
@@ -84,7 +87,7 @@ static struct {
   free_text_fn free_text;
 } sdk;
 
-static void ORVANE_CALL print_message(LogLevel level, const char *message) {
+static void ORVANE_CALL print_message(OrvaneLogLevel level, const char *message) {
   static const char *const names[] = {"INFO", "WARNING", "ERROR"};
   const char *name = (level >= 0 && level <= 2) ? names[level] : "?";
   printf("  [%d %s] %s\n", (int)level, name, message);

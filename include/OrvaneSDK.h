@@ -62,9 +62,9 @@ extern "C" {
 #define ORVANE_LOG_ERROR 2   /* refused input or a failure */
 
 #ifdef __cplusplus
-enum class LogLevel : int32_t { Info = 0, Warning = 1, Error = 2 };
+enum class OrvaneLogLevel : int32_t { Info = 0, Warning = 1, Error = 2 };
 #else
-typedef int32_t LogLevel;
+typedef int32_t OrvaneLogLevel;
 #endif
 
 /*
@@ -75,7 +75,16 @@ typedef int32_t LogLevel;
  * withdrawing it waits for its calls to end. C# hosts use
  * bindings/csharp/OrvaneSDK.cs, which keeps its delegate alive.
  */
-typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
+typedef void(ORVANE_CALL *OrvaneLogCallback)(OrvaneLogLevel level, const char *message);
+
+/*
+ * The short names of earlier headers. A host that has its own LogLevel or
+ * LogCallback defines ORVANE_NO_SHORT_NAMES before including this header.
+ */
+#ifndef ORVANE_NO_SHORT_NAMES
+typedef OrvaneLogLevel LogLevel;
+typedef OrvaneLogCallback LogCallback;
+#endif
 
 /*
  * Registers the one log callback, replacing the previous one (null included).
@@ -92,7 +101,7 @@ typedef void(ORVANE_CALL *LogCallback)(LogLevel level, const char *message);
  * callback takes, nor from callbacks on two threads at once: each would wait
  * for the other.
  */
-ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback);
+ORVANE_API void ORVANE_CALL oRegisterForLogs(OrvaneLogCallback callback);
 
 /*
  * Creates the storage directories (Windows: C:\Orvane\ and C:\Orvane\Logs\)

@@ -5,7 +5,7 @@
 
 extern "C" {
 
-ORVANE_API void ORVANE_CALL oRegisterForLogs(LogCallback callback) {
+ORVANE_API void ORVANE_CALL oRegisterForLogs(OrvaneLogCallback callback) {
   const orvane::platform::CancellationOff uncancellable;
   orvane::RegisterForLogs(callback);
 }
