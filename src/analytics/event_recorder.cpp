@@ -175,7 +175,9 @@ void OpenLog(MessageBatch &messages, const Event &event, const std::string &path
 
 // Waits for the log's lock until a deadline on the steady clock: a count of
 // pauses would not bound the time, since signals cut pauses short and
-// Windows stretches them to its timer tick.
+// Windows stretches them to its timer tick. This is the only lock a
+// recording takes, and it is given back before the call's messages go to
+// the host, so a callback may record again (src/README.md, "Locks").
 bool LockWithinDeadline(LogFile &log) {
   const platform::Calls &os = platform::calls();
   const std::int64_t deadline = os.steady_milliseconds() + kLockWaitMilliseconds;
