@@ -1,14 +1,13 @@
 // What only POSIX systems have: file modes, links, FIFOs, a real full disk,
 // thread cancellation, and where the files go.
 #include "OrvaneSDK.h"
-#include "core/storage.h"
 #include "support/test_support.h"
 
 #include <atomic>
 #include <csignal>
-#include <cstdlib>
 #include <filesystem>
 #include <pthread.h>
+#include <pwd.h>
 #include <string>
 #include <sys/resource.h>
 #include <sys/stat.h>
@@ -107,33 +106,25 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
 }
 
-// Where the files go on POSIX: XDG_DATA_HOME when absolute, else
-// $HOME/.local/share.
+// Where the files go on POSIX: XDG_DATA_HOME when absolute, else an absolute
+// $HOME/.local/share, else the account's home directory. (Each test runs in
+// a process of its own, so the environment is not put back.)
 TEST(StorageLocation, FollowsTheEnvironment) {
-  struct Case {
-    const char *xdg;
-    const char *home;
-    std::string root;
-  };
-  const Case cases[] = {
-      {"/data/x", "/home/u", "/data/x/Orvane/"},
-      {"/data/x/", "/home/u", "/data/x/Orvane/"},
-      {"relative/x", "/home/u", "/home/u/.local/share/Orvane/"},
-      {"", "/home/u", "/home/u/.local/share/Orvane/"},
-      {nullptr, "/home/v", "/home/v/.local/share/Orvane/"},
-  };
-  const char *saved_xdg = std::getenv("XDG_DATA_HOME");
-  const char *saved_home = std::getenv("HOME");
-  std::string xdg_copy = saved_xdg ? saved_xdg : "", home_copy = saved_home ? saved_home : "";
-  for (const Case &c : cases) {
-    if (c.xdg) ::setenv("XDG_DATA_HOME", c.xdg, 1); else ::unsetenv("XDG_DATA_HOME");
-    ::setenv("HOME", c.home, 1);
-    platform::StorageLocation where = platform::default_storage_location();
-    EXPECT_EQ(where.root, c.root) << (c.xdg ? c.xdg : "(unset)");
-    EXPECT_EQ(where.logs, c.root + "Logs/");
+  const std::string account = ::getpwuid(::getuid())->pw_dir;
+  const struct {
+    const char *xdg, *home;
+    std::string logs;
+  } cases[] = {{"/data/x/", "/home/u", "/data/x/Orvane/Logs/"},
+               {"relative/x", "/home/u", "/home/u/.local/share/Orvane/Logs/"},
+               {nullptr, "relative", account + "/.local/share/Orvane/Logs/"},
+               {nullptr, nullptr, account + "/.local/share/Orvane/Logs/"}};
+  for (const auto &c : cases) {
+    c.xdg ? ::setenv("XDG_DATA_HOME", c.xdg, 1) : ::unsetenv("XDG_DATA_HOME");
+    c.home ? ::setenv("HOME", c.home, 1) : ::unsetenv("HOME");
+    const platform::StorageLocation where = platform::default_storage_location();
+    EXPECT_EQ(where.logs, c.logs);
+    EXPECT_EQ(where.root + "Logs/", where.logs);
   }
-  if (saved_xdg) ::setenv("XDG_DATA_HOME", xdg_copy.c_str(), 1); else ::unsetenv("XDG_DATA_HOME");
-  if (saved_home) ::setenv("HOME", home_copy.c_str(), 1); else ::unsetenv("HOME");
 }
 
 } // namespace
