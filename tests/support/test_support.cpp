@@ -1,6 +1,7 @@
 #include "support/test_support.h"
 
 #include "core/storage.h"
+#include "logformat/hex.h"
 
 #include <openssl/evp.h>
 
@@ -68,20 +69,15 @@ std::string KeyTextFor(std::string_view game_id) {
 }
 
 std::optional<std::string> DecryptLine(std::string_view hex, std::string_view key_text) {
-  std::string bytes;
-  for (std::size_t i = 0; i + 1 < hex.size() + (hex.size() % 2); i += 2) {
-    const std::string pair(hex.substr(i, 2));
-    if (pair.size() != 2 || pair.find_first_not_of("0123456789abcdef") != std::string::npos) return std::nullopt;
-    bytes.push_back(static_cast<char>(std::stoi(pair, nullptr, 16)));
-  }
+  std::vector<std::uint8_t> bytes;
+  if (key_text.size() != 80 || !DecodeHex(hex, bytes)) return std::nullopt;
   const auto *key = reinterpret_cast<const unsigned char *>(key_text.data());
   std::string plain(bytes.size() + 16, '\0');
   auto *out = reinterpret_cast<unsigned char *>(plain.data());
   int first = 0, second = 0;
   EVP_CIPHER_CTX *ctx = EVP_CIPHER_CTX_new();
-  const bool ok = key_text.size() == 80 && EVP_DecryptInit_ex(ctx, EVP_aes_256_cbc(), nullptr, key, key + 64) == 1 &&
-                  EVP_DecryptUpdate(ctx, out, &first, reinterpret_cast<const unsigned char *>(bytes.data()),
-                                    static_cast<int>(bytes.size())) == 1 &&
+  const bool ok = EVP_DecryptInit_ex(ctx, EVP_aes_256_cbc(), nullptr, key, key + 64) == 1 &&
+                  EVP_DecryptUpdate(ctx, out, &first, bytes.data(), static_cast<int>(bytes.size())) == 1 &&
                   EVP_DecryptFinal_ex(ctx, out + first, &second) == 1;
   EVP_CIPHER_CTX_free(ctx);
   if (!ok) return std::nullopt;
