@@ -1,87 +1,56 @@
 #!/bin/bash
-# The release archives as game teams take them: unpacked, then four tiny games
-# (consumer.c) built against them, never against the source tree:
-#   a  Linux, find_package(OrvaneSDK 1.0 REQUIRED)   b  Linux, pkg-config
-#   c  mingw-w64, find_package, run under wine
-#   d  MSVC ABI: clang + lld-link against OrvaneSDK.lib, no C runtime, under wine
-# Each records a game's first event on a new log, which the packaged Linux
-# orvane-logcat reads back as an INIT and an ENTER record. Also checked: the
-# SONAME, the stripped DLL's size, and gdb finding our functions' source lines
-# through each library's separate symbols file.
-#   consumers.sh PACKAGE_DIR WORK_DIR      (WORK_DIR/wineprefix is kept)
+# The release archives as game teams take them, unpacked, and four tiny games
+# built against them: a Linux find_package, b Linux pkg-config, c mingw-w64
+# find_package, d MSVC ABI (clang + lld-link, OrvaneSDK.lib); c and d under wine.
+# The archive's orvane-logcat reads each one's first event back; then gdb must
+# find our source lines through the symbols archives.  consumers.sh PACKAGES WORK
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
-packages=$(cd "$1" && pwd)
-mkdir -p "$2" && cd "$2" && rm -rf run && mkdir run
+packages=$(cd "$1" && pwd) # WORK/wineprefix is kept between runs
+mkdir -p "$2" && cd "$2" && rm -rf run && mkdir -p run/b run/d
 export WINEPREFIX=$PWD/wineprefix WINEDEBUG=-all
 cd run
 for archive in "$packages"/OrvaneSDK-*; do cmake -E tar xf "$archive"; done
 linux=$(echo "$PWD"/OrvaneSDK-*-linux-*) windows=$(echo "$PWD"/OrvaneSDK-*-windows-*)
 export PKG_CONFIG_PATH=$linux/lib/pkgconfig
-version=$(pkg-config --modversion orvanesdk)
-warnings="-Wall -Wextra -Wpedantic -Werror"
-
+flags=(-Wall -Wextra -Wpedantic -Werror "-DORVANE_EXPECTED_VERSION=\"$(pkg-config --modversion orvanesdk)\"")
 fail() { echo "FAILED: $*"; exit 1; }
-# step NAME COMMAND...: runs COMMAND, its output kept in NAME.log and shown
-# when it fails.
-step() {
-  local log=$1.log
-  shift
-  "$@" >>"$log" 2>&1 || { cat "$log"; fail "$*"; }
-}
-# read_back LOG WHAT: the log holds exactly an INIT and an ENTER record.
-read_back() {
-  local types
-  types=$("$linux/bin/orvane-logcat" "$1" | grep -o '"type":"[A-Z]*"' | tr -d '\n')
-  [ "$types" = '"type":"INIT""type":"ENTER"' ] || fail "$1 holds $types"
-  echo "$2: first event recorded and read back"
-}
-# under_wine NAME EXE WHAT: the first event of a Windows game on a new C:\Orvane.
-under_wine() {
-  rm -rf "$WINEPREFIX/drive_c/Orvane"
-  step "$1" bash "$here/../windows/wine_run.sh" "$WINEPREFIX" "$2"
-  read_back "$WINEPREFIX/drive_c/Orvane/Logs/consumer.log" "$3"
+# run NAME COMMAND...: the output goes to NAME.log, shown when COMMAND fails.
+run() { "${@:2}" >>"$1.log" 2>&1 || { cat "$1.log"; fail "${*:2}"; }; }
+# first_event NAME DATA_DIR COMMAND...: the log COMMAND makes in DATA_DIR holds an INIT and an ENTER record.
+first_event() {
+  rm -rf "$2/Orvane" && run "$1" "${@:3}"
+  types=$("$linux/bin/orvane-logcat" "$2/Orvane/Logs/consumer.log" | grep -o '"type":"[A-Z]*"' | tr -d '\n')
+  [ "$types" = '"type":"INIT""type":"ENTER"' ] || fail "$1: the log holds $types"
+  echo "$1: first event recorded and read back"
 }
 
-step a cmake -S "$here" -B a -G Ninja -DCMAKE_PREFIX_PATH="$linux"
-step a cmake --build a
-[[ $(readelf -d a/consumer) =~ NEEDED[^$'\n']*\[libOrvaneSDK\.so\.1\] ]] || fail "a/consumer needs no libOrvaneSDK.so.1"
-XDG_DATA_HOME=$PWD/a-data step a a/consumer
-read_back a-data/Orvane/Logs/consumer.log "a (Linux, find_package)"
-
+run a cmake -S "$here" -B a -G Ninja -DCMAKE_PREFIX_PATH="$linux"
+run a cmake --build a
+[[ $(readelf -d a/consumer) == *'(NEEDED)'*'[libOrvaneSDK.so.1]'* ]] || fail "a/consumer needs no libOrvaneSDK.so.1"
+XDG_DATA_HOME=$PWD/a first_event a "$PWD/a" a/consumer
 # shellcheck disable=SC2046 # pkg-config's flags are separate words
-step b cc $warnings -DORVANE_EXPECTED_VERSION="\"$version\"" "$here/consumer.c" -o b-consumer \
-  $(pkg-config --cflags --libs orvanesdk) -Wl,-rpath,"$(pkg-config --variable=libdir orvanesdk)"
-XDG_DATA_HOME=$PWD/b-data step b ./b-consumer
-read_back b-data/Orvane/Logs/consumer.log "b (Linux, pkg-config)"
-
-wineboot -i </dev/null >/dev/null 2>&1
-wineserver -w
-trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
-wineserver -p </dev/null >/dev/null 2>&1
-
-step c cmake -S "$here" -B c -G Ninja -DCMAKE_SYSTEM_NAME=Windows \
+run b cc "${flags[@]}" "$here/consumer.c" -o b/consumer $(pkg-config --cflags --libs orvanesdk) \
+  -Wl,-rpath,"$(pkg-config --variable=libdir orvanesdk)"
+XDG_DATA_HOME=$PWD/b first_event b "$PWD/b" b/consumer
+run c cmake -S "$here" -B c -G Ninja -DCMAKE_SYSTEM_NAME=Windows \
   -DCMAKE_C_COMPILER=x86_64-w64-mingw32-gcc-posix -DCMAKE_PREFIX_PATH="$windows"
-step c cmake --build c
-cp "$windows/bin/OrvaneSDK.dll" c/
-under_wine c c/consumer.exe "c (mingw-w64, find_package, wine)"
-
-# kernel32 comes from mingw-w64's import library, which lld-link reads too.
-mkdir d && cp "$windows/bin/OrvaneSDK.dll" d/
-step d clang --target=x86_64-pc-windows-msvc -ffreestanding $warnings -I"$windows/include" \
-  -DORVANE_EXPECTED_VERSION="\"$version\"" -c "$here/consumer.c" -o d/consumer.obj
-step d lld-link /nologo /entry:start /subsystem:console /nodefaultlib /out:d/consumer.exe \
-  d/consumer.obj "$windows/lib/OrvaneSDK.lib" /usr/x86_64-w64-mingw32/lib/libkernel32.a
-under_wine d d/consumer.exe "d (MSVC ABI, OrvaneSDK.lib, wine)"
-
-[[ $(readelf -d "$linux/lib/libOrvaneSDK.so") =~ SONAME[^$'\n']*\[libOrvaneSDK\.so\.1\] ]] || fail "SONAME"
-size=$(stat -c %s "$windows/bin/OrvaneSDK.dll")
-[ "$size" -lt 400000 ] || fail "OrvaneSDK.dll is $size bytes"
-for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
-  if ! gdb -batch -ex 'info line oAnalyticsGameEnter' -ex 'info line orvane::RecordEvent' "$library" >gdb.log 2>&1 ||
-    [ "$(grep -cE 'of ".*/src/analytics/(exports_analytics|event_recorder)\.cpp"' gdb.log)" -ne 2 ]; then
-    cat gdb.log
-    fail "gdb finds no source lines of ours in $library"
-  fi
+run c cmake --build c
+# kernel32 and msvcrt come from mingw-w64's import libraries, which lld-link reads too.
+run d clang --target=x86_64-pc-windows-msvc -ffreestanding "${flags[@]}" -I"$windows/include" \
+  -c "$here/consumer.c" -o d/consumer.obj
+run d lld-link /nologo /entry:start /subsystem:console /nodefaultlib /out:d/consumer.exe d/consumer.obj \
+  "$windows/lib/OrvaneSDK.lib" /usr/x86_64-w64-mingw32/lib/lib{kernel32,msvcrt}.a
+trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
+wineboot -i </dev/null >/dev/null 2>&1
+for game in c d; do
+  cp "$windows/bin/OrvaneSDK.dll" $game/
+  first_event $game "$WINEPREFIX/drive_c" bash "$here/../windows/wine_run.sh" "$WINEPREFIX" $game/consumer.exe
 done
-echo "SONAME libOrvaneSDK.so.1; OrvaneSDK.dll $size bytes; gdb reads both symbols files"
+
+[ "$(stat -c %s "$windows/bin/OrvaneSDK.dll")" -lt 400000 ] || fail "OrvaneSDK.dll is not stripped"
+for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
+  gdb -batch -ex 'info line oAnalyticsGameEnter' -ex 'info line orvane::RecordEvent' "$library" >gdb.log 2>&1 || true
+  [ "$(grep -cE 'of ".*/src/(api/exports_analytics|analytics/event_recorder)\.cpp"' gdb.log)" = 2 ] ||
+    { cat gdb.log; fail "gdb finds no source lines of ours in $library"; }
+done

@@ -1,26 +1,10 @@
 #!/bin/bash
-# Runs a Windows test program under wine for ctest.
-#
-#   wine_run.sh PREFIX PROGRAM.exe [ARGS...]
-#
-# Always in the build's own wine prefix, so that a test's C:\Orvane is the one
-# inside the build directory and never the user's ~/.wine. Wine's diagnostics
-# are off. The C runtime writes CR LF line ends; the CRs are removed so that
-# gtest's test list parses and output compares as on Linux.
-export WINEPREFIX=$1 WINEDEBUG=-all
-shift
-# Creating a prefix starts wine's services, which outlive the test: the prefix
-# must exist beforehand (scripts/ci-windows.sh makes it).
-if [ ! -f "$WINEPREFIX/system.reg" ]; then
-  echo "wine_run.sh: no wine prefix at $WINEPREFIX; create it first (scripts/ci-windows.sh)" >&2
-  exit 1
-fi
-# The output goes through a file, not a pipe: wine services that the program
-# happens to start inherit its standard streams and live on, and a pipe held
-# by them would keep ctest waiting for its end.
+# wine_run.sh PREFIX PROGRAM.exe [ARGS...]: runs it in the build's own prefix
+# (never ~/.wine), the CRs of its output dropped to compare as on Linux.
+# A new prefix starts wine's services, which outlive the test and hold its
+# output open: scripts/ci-windows.sh makes the prefix beforehand, and the
+# output goes through a file, which services the program starts may inherit.
+[ -f "$1/system.reg" ] || { echo "wine_run.sh: no wine prefix at $1" >&2; exit 1; }
 output=$(mktemp)
-trap 'rm -f "$output"' EXIT
-wine "$@" </dev/null >"$output" 2>&1
-status=$?
-tr -d '\r' <"$output"
-exit $status
+trap 'tr -d "\r" <"$output"; rm -f "$output"' EXIT # the exit status stays wine's
+WINEPREFIX=$1 WINEDEBUG=-all wine "${@:2}" </dev/null >"$output" 2>&1

@@ -1,30 +1,13 @@
-// The few OpenSSL EVP calls with which the tests decrypt a log line on their
-// own, answered by Windows CNG: mingw has no OpenSSL. They call bcrypt
-// directly and share no code with the library's cipher backend; the
-// known-answer vectors and the decryption of a wine-written log by the
-// `openssl` tool on Linux check both against OpenSSL itself.
+// The EVP calls with which the tests decrypt log lines themselves, answered by
+// CNG (mingw has no OpenSSL), sharing no code with the library's cipher.
+// Update decrypts a whole line, padding stripped; Final adds nothing.
 #pragma once
-
-#ifdef __cplusplus
 extern "C" {
-#endif
-
-typedef struct evp_cipher_ctx_st EVP_CIPHER_CTX;
-typedef struct evp_cipher_st EVP_CIPHER;
-typedef struct engine_st ENGINE;
-
-EVP_CIPHER_CTX *EVP_CIPHER_CTX_new(void);
+struct EVP_CIPHER_CTX;
+EVP_CIPHER_CTX *EVP_CIPHER_CTX_new();
 void EVP_CIPHER_CTX_free(EVP_CIPHER_CTX *ctx);
-const EVP_CIPHER *EVP_aes_256_cbc(void);
-
-// Decryption only. Update collects the ciphertext and writes nothing; Final
-// decrypts it whole and strips the padding.
-int EVP_DecryptInit_ex(EVP_CIPHER_CTX *ctx, const EVP_CIPHER *cipher, ENGINE *engine,
-                       const unsigned char *key, const unsigned char *iv);
-int EVP_DecryptUpdate(EVP_CIPHER_CTX *ctx, unsigned char *out, int *out_size,
-                      const unsigned char *in, int in_size);
-int EVP_DecryptFinal_ex(EVP_CIPHER_CTX *ctx, unsigned char *out, int *out_size);
-
-#ifdef __cplusplus
+const void *EVP_aes_256_cbc();
+int EVP_DecryptInit_ex(EVP_CIPHER_CTX *ctx, const void *, void *, const unsigned char *key, const unsigned char *iv);
+int EVP_DecryptUpdate(EVP_CIPHER_CTX *ctx, unsigned char *out, int *out_size, const unsigned char *in, int in_size);
+int EVP_DecryptFinal_ex(EVP_CIPHER_CTX *, unsigned char *, int *out_size);
 }
-#endif
