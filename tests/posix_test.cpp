@@ -1,15 +1,13 @@
-// What only POSIX systems have: file modes, links, FIFOs, a real full disk,
-// thread cancellation, and where the files go.
+// What only POSIX systems have: file modes, links, FIFOs, thread
+// cancellation, and where the files go.
 #include "OrvaneSDK.h"
 #include "support/test_support.h"
 
 #include <atomic>
-#include <csignal>
 #include <filesystem>
 #include <pthread.h>
 #include <pwd.h>
 #include <string>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -52,27 +50,6 @@ TEST_F(PosixTest, OnlyARegularFileIsALog) {
   }
   EXPECT_EQ(ReadFile(outside), "kept");
   EXPECT_FALSE(std::filesystem::exists(base_ + "/planted"));
-}
-
-TEST_F(PosixTest, ALineThatDoesNotFitIsAnErrorNotOk) {
-  std::filesystem::create_directories(where_.logs);
-  ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
-  const std::string before = *ReadFile(LogPath("g1"));
-
-  rlimit saved;
-  ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
-  auto previous = std::signal(SIGXFSZ, SIG_IGN);
-  rlimit full = saved;
-  full.rlim_cur = before.size(); // not one byte more fits
-  ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &full), 0);
-  Captured().clear();
-  const int result = oAnalyticsGameEnter("g1", "u1");
-  ::setrlimit(RLIMIT_FSIZE, &saved);
-  std::signal(SIGXFSZ, previous);
-
-  EXPECT_EQ(result, -1);
-  EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - log file failed to write."}}));
-  EXPECT_EQ(*ReadFile(LogPath("g1")), before);
 }
 
 // A game may cancel a thread that is inside a call: the call runs to its
