@@ -53,7 +53,7 @@ package_leg
 
 if [ -x scripts/fuzz.sh ]; then
   step "Fuzzers"
-  scripts/fuzz.sh "${ORVANE_FUZZ_SECONDS:-60}"
+  scripts/fuzz.sh "${ORVANE_FUZZ_SECONDS:-30}"
 fi
 
 step "All legs passed"

@@ -1,172 +1,92 @@
-// The C# binding under mono, against the built libOrvaneSDK.so. One program,
-// one case per run (ctest names the case and passes the command line):
-//   example LOGCAT --userUuid--... --gameId--...   the worked example
-//   free-loop --userUuid--...                      results freed, no growth
-//   threads                                        messages from four threads
-//   reload                                         a handler in an unloaded domain
-// Every run records under its own temporary XDG_DATA_HOME.
+// The C# binding under mono against the built libOrvaneSDK.so, one case per run (the command lines
+// are in CMakeLists.txt), each under a temporary XDG_DATA_HOME of its own.
 using System;
 using System.Collections.Generic;
 using System.Diagnostics;
 using System.IO;
-using System.Text;
+using System.Linq;
 using System.Text.RegularExpressions;
 using System.Threading;
 using Orvane;
 
-static class BindingTest
-{
-    static int failures;
-    static string data;
+static class BindingTest {
+    static readonly string data = Path.GetTempPath() + "orvane-csharp-" + Guid.NewGuid().ToString("N");
 
-    static void Equal<T>(T expected, T actual, string what)
-    {
-        if (EqualityComparer<T>.Default.Equals(expected, actual)) return;
-        Console.WriteLine("FAILED: " + what + "\n  expected: " + expected + "\n  actual:   " + actual);
-        ++failures;
+    static void Equal<T>(T expected, T got, string what) {
+        if (!Equals(expected, got)) throw new Exception(what + "\n  expected: " + expected + "\n  got:      " + got);
     }
 
-    static int Main(string[] args)
-    {
-        // Before the first call loads the library, which reads it then.
-        data = Path.Combine(Path.GetTempPath(), "orvane-csharp-" + Guid.NewGuid().ToString("N"));
-        Directory.CreateDirectory(data);
-        Environment.SetEnvironmentVariable("XDG_DATA_HOME", data);
-        try
-        {
-            switch (args[0])
-            {
-                case "example": Example(args[1]); break;
-                case "free-loop": FreeLoop(); break;
-                case "threads": Threads(); break;
-                case "reload": Reload(); break;
-                default: throw new ArgumentException("unknown case " + args[0]);
-            }
-        }
-        finally
-        {
-            Directory.Delete(data, true);
-        }
-        Console.WriteLine(failures == 0 ? "passed" : failures + " check(s) failed");
-        return failures == 0 ? 0 : 1;
+    static int Main(string[] args) {
+        Environment.SetEnvironmentVariable("XDG_DATA_HOME", Directory.CreateDirectory(data).FullName); // read at load
+        var cases = new Dictionary<string, Action> {{"example", () => Example(args[1])},
+            {"free-loop", () => FreeLoop(args[1])}, {"threads", Threads}, {"reload", Reload}};
+        try { cases[args[0]](); return 0; }
+        catch (Exception e) { Console.WriteLine("FAILED: " + e.Message); return 1; }
+        finally { Directory.Delete(data, true); }
     }
 
-    // A game's first event on a machine where nothing is stored yet, with
-    // its identity from this process's command line; then every other call.
-    static void Example(string logcat)
-    {
+    // A game's first event on a machine where nothing is stored yet, with its identity from this
+    // process's command line, then every other call; the log read back by orvane-logcat.
+    static void Example(string logcat) {
         var heard = new List<string>();
-        OrvaneSDK.RegisterForLogs((level, message) => heard.Add((int)level + " " + message));
-        string user = OrvaneSDK.GetUserUuid(), game = OrvaneSDK.GetGameId();
-        Equal("a1b2c3d4", user, "GetUserUuid");
-        Equal("demo42", game, "GetGameId");
-        Equal(0, OrvaneSDK.AnalyticsGameEnter(game, user), "AnalyticsGameEnter");
-        Equal(0, OrvaneSDK.AnalyticsInit(game, user), "AnalyticsInit on a started log");
-        Equal(0, OrvaneSDK.AnalyticsSpecial(game, user, "caf\u00e9 \"\u2713\""), "AnalyticsSpecial");
-        Equal(0, OrvaneSDK.AnalyticsGameExit(game, user), "AnalyticsGameExit");
-        Equal(-1, OrvaneSDK.AnalyticsGameEnter(null, user), "a null game id");
+        OrvaneSDK.RegisterForLogs((level, message) => heard.Add(level.ToString()[0] + message.Substring(12)));
+        string user = OrvaneSDK.GetUserUuid(), game = OrvaneSDK.GetGameId(), extra = "caf\u00e9 \"\u2713\"";
+        Equal("a1b2c3d4 demo42 0 0 0 0 -1", string.Join(" ", user, game, OrvaneSDK.AnalyticsGameEnter(game, user),
+            OrvaneSDK.AnalyticsInit(game, user), OrvaneSDK.AnalyticsSpecial(game, user, extra),
+            OrvaneSDK.AnalyticsGameExit(game, user), OrvaneSDK.AnalyticsGameEnter(null, user)), "identity, results");
         OrvaneSDK.Initialize();
-        OrvaneSDK.RegisterForLogs(null);
-        Equal("demo42", OrvaneSDK.GetGameId(), "GetGameId, unregistered");
-        string[] expected = {
-            "0 [OrvaneSDK] Logging initiated.",
-            "0 [OrvaneSDK] Authentication - OK",
-            "0 [OrvaneSDK] Return GameID - OK",
-            "0 [OrvaneSDK] Analytics ENTER - SDK was never initialized. Initializing the SDK.",
-            "0 [OrvaneSDK] Initialize() - OK.",
-            "1 [OrvaneSDK] Analytics ENTER - log was never initialized. Initialized the game log",
-            "0 [OrvaneSDK] Analytics INIT - OK",
-            "0 [OrvaneSDK] Analytics ENTER - OK",
-            "1 [OrvaneSDK] Analytics INIT - log had been already initialized.",
-            "0 [OrvaneSDK] Analytics SPECIAL - OK",
-            "0 [OrvaneSDK] Analytics EXIT - OK",
-            "2 [OrvaneSDK] Analytics ENTER - failed. Game id is empty",
-            "0 [OrvaneSDK] Initialize() - OK.",
-        };
-        Equal(string.Join("\n", expected), string.Join("\n", heard), "messages");
-
-        var run = new ProcessStartInfo(logcat, Path.Combine(data, "Orvane/Logs/demo42.log"));
-        run.UseShellExecute = false;
-        run.RedirectStandardOutput = true;
-        run.StandardOutputEncoding = Encoding.UTF8;
+        Equal("ILogging initiated.|IAuthentication - OK|IReturn GameID - OK|IAnalytics ENTER - SDK was never " +
+              "initialized. Initializing the SDK.|IInitialize() - OK.|WAnalytics ENTER - log was never initialized. " +
+              "Initialized the game log|IAnalytics INIT - OK|IAnalytics ENTER - OK|WAnalytics INIT - log had been " +
+              "already initialized.|IAnalytics SPECIAL - OK|IAnalytics EXIT - OK|EAnalytics ENTER - failed. Game id " +
+              "is empty|IInitialize() - OK.", string.Join("|", heard), "messages, level letter first");
+        var run = new ProcessStartInfo(logcat, data + "/Orvane/Logs/demo42.log") {UseShellExecute = false,
+            RedirectStandardOutput = true, StandardOutputEncoding = System.Text.Encoding.UTF8};
         Process reader = Process.Start(run);
-        string records = reader.StandardOutput.ReadToEnd();
+        string records = Regex.Replace(reader.StandardOutput.ReadToEnd(), @"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d", "T");
         reader.WaitForExit();
-        Equal(0, reader.ExitCode, "orvane-logcat's exit status");
-        Func<string, string, string> line = (type, extra) => "{\"user_id\":\"a1b2c3d4\",\"game_id\":\"demo42\"," +
-            "\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" + extra + "\"}\n";
-        Equal(line("INIT", "") + line("ENTER", "") + line("SPECIAL", "caf\u00e9 \\\"\u2713\\\"") + line("EXIT", ""),
-              Regex.Replace(records, "\"time\":\"\\d{4}-\\d\\d-\\d\\dT\\d\\d:\\d\\d:\\d\\d\"", "\"time\":\"T\""),
-              "the log read back");
+        Func<string, string, string> line = (type, text) => "{\"user_id\":\"a1b2c3d4\",\"game_id\":\"demo42\"," +
+            "\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" + text.Replace("\"", "\\\"") + "\"}\n";
+        Equal(line("INIT", "") + line("ENTER", "") + line("SPECIAL", extra) + line("EXIT", "") + 0,
+              records + reader.ExitCode, "the log read back by orvane-logcat, and its exit status");
     }
 
-    // Get-and-free, found and empty, until the heap has settled; then
-    // 100,000 more must not grow the process (a block kept per call would
-    // add megabytes; freeing the constant empty text would crash).
-    static void FreeLoop()
-    {
-        string uuid = Environment.GetCommandLineArgs()[2].Substring("--userUuid--".Length);
-        Action getAndFree = () => {
-            Equal(uuid, OrvaneSDK.GetUserUuid(), "GetUserUuid");
-            Equal("", OrvaneSDK.GetGameId(), "GetGameId");
-        };
-        for (int i = 0; i < 50000; ++i) getAndFree();
-        long before = ResidentBytes();
-        for (int i = 0; i < 50000; ++i) getAndFree();
-        long growth = ResidentBytes() - before;
-        Equal(true, growth < 4 << 20, "resident memory growth below 4 MiB over 100,000 calls (" + growth + " bytes)");
-    }
-
-    static long ResidentBytes()
-    {
-        GC.Collect();
-        GC.WaitForPendingFinalizers();
-        return long.Parse(File.ReadAllText("/proc/self/statm").Split(' ')[1]) * Environment.SystemPageSize;
-    }
-
-    // Four threads report at once; each message reaches the handler on the
-    // thread that caused it.
-    [ThreadStatic] static int threadIndex; // 0 on the main thread
-    static void Threads()
-    {
-        const int threads = 4, calls = 1000;
-        var heard = new int[threads + 1];
-        OrvaneSDK.RegisterForLogs((level, message) => {
-            if (level == LogLevel.Error && message == "[OrvaneSDK] Return GameID - Empty") Interlocked.Increment(ref heard[threadIndex]);
-        });
-        var start = new Barrier(threads);
-        var running = new List<Thread>();
-        for (int t = 1; t <= threads; ++t)
-        {
-            int index = t;
-            running.Add(new Thread(() => {
-                threadIndex = index;
-                start.SignalAndWait();
-                for (int i = 0; i < calls; ++i) OrvaneSDK.GetGameId();
-            }));
-            running[running.Count - 1].Start();
+    // Get-and-free, found and empty, until the heap has settled; then 50,000 more must not grow the
+    // process (a block kept per call would add megabytes; freeing the constant empty text would crash).
+    static void FreeLoop(string argument) {
+        long growth = 0, page = Environment.SystemPageSize; // resident after 50,000 calls, then 50,000 more add
+        for (int i = 1; i <= 100000; ++i) {
+            Equal(argument + "|", "--userUuid--" + OrvaneSDK.GetUserUuid() + "|" + OrvaneSDK.GetGameId(), "results");
+            if (i % 50000 != 0) continue;
+            GC.Collect();
+            growth = long.Parse(File.ReadAllText("/proc/self/statm").Split(' ')[1]) * page - growth;
         }
-        foreach (Thread thread in running) thread.Join();
-        OrvaneSDK.RegisterForLogs(null);
-        Equal("0 1000 1000 1000 1000", string.Join(" ", heard), "messages heard per thread (main, then the four)");
+        Equal(true, growth < 4 << 20, "resident memory growth below 4 MiB over 50,000 calls (" + growth + " bytes)");
     }
 
-    // A script domain registers and is unloaded, as Unity's Editor reloads
-    // scripts: the binding withdraws the handler first, so an event from the
-    // main domain neither calls into the unloaded code nor reaches it.
-    static void Reload()
-    {
+    // Four threads report together; each message reaches the handler on the thread that caused it.
+    [ThreadStatic] static int heardHere;
+    static void Threads() {
+        var heard = new int[4];
+        OrvaneSDK.RegisterForLogs((level, message) => { if (level == LogLevel.Error) ++heardHere; });
+        var threads = Enumerable.Range(0, 4).Select(t => new Thread(() => {
+            for (int i = 0; i < 1000; ++i) OrvaneSDK.GetGameId(); // "Return GameID - Empty", an error
+            heard[t] = heardHere;
+        })).ToList();
+        threads.ForEach(thread => thread.Start());
+        threads.ForEach(thread => thread.Join());
+        OrvaneSDK.RegisterForLogs(null);
+        Equal("0 1000 1000 1000 1000", heardHere + " " + string.Join(" ", heard), "heard on main, then each thread");
+    }
+
+    // A script domain registers and is unloaded, as Unity's Editor reloads scripts: the binding withdraws
+    // the handler first, so an event from the main domain neither calls into the unloaded code nor reaches it.
+    static void Reload() {
         AppDomain scripts = AppDomain.CreateDomain("scripts");
-        scripts.SetData("heard", Path.Combine(data, "heard"));
-        scripts.DoCallBack(RegisterInDomain);
+        scripts.DoCallBack(() => OrvaneSDK.RegisterForLogs((level, message) => // where `data` is another path
+            File.AppendAllText(Environment.GetEnvironmentVariable("XDG_DATA_HOME") + "/heard", message + "\n")));
         AppDomain.Unload(scripts);
         Equal(0, OrvaneSDK.AnalyticsGameEnter("g1", "u1"), "an event after the unload");
-        Equal("[OrvaneSDK] Logging initiated.\n", File.ReadAllText(Path.Combine(data, "heard")), "what the withdrawn handler heard");
-    }
-
-    static void RegisterInDomain()
-    {
-        string heard = (string)AppDomain.CurrentDomain.GetData("heard");
-        OrvaneSDK.RegisterForLogs((level, message) => File.AppendAllText(heard, message + "\n"));
+        Equal("[OrvaneSDK] Logging initiated.\n", File.ReadAllText(data + "/heard"), "what the handler heard");
     }
 }
