@@ -16,10 +16,10 @@
 #include "event_floor.h"
 
 #include "analytics/record_cipher.h"
+#include "core/log_channel.h"
+#include "identity/command_line.h"
 #include "logformat/record_text.h"
 #include "logformat/timestamp.h"
-#include "identity/command_line.h"
-#include "core/log_channel.h"
 
 #include <benchmark/benchmark.h>
 
@@ -78,8 +78,7 @@ EventSetup PrepareEvents() {
 }
 
 void FloorOnce(const EventSetup &setup) {
-  if (FloorEvent(setup.logs.c_str(), setup.floor_path.c_str(), setup.line.data(),
-                 setup.line.size()) != 0)
+  if (FloorEvent(setup.logs.c_str(), setup.floor_path.c_str(), setup.line.data(), setup.line.size()) != 0)
     std::abort();
 }
 
@@ -239,7 +238,8 @@ void ScalingReport(const EventSetup &setup, int rounds, int batch) {
   const auto floor = [&setup](bool own) {
     return [&setup, own](int t) {
       const std::string path = own ? setup.logs + kThreadFloorFiles[t] : setup.floor_path;
-      if (FloorEvent(setup.logs.c_str(), path.c_str(), setup.line.data(), setup.line.size()) != 0) std::abort();
+      if (FloorEvent(setup.logs.c_str(), path.c_str(), setup.line.data(), setup.line.size()) != 0)
+        std::abort();
     };
   };
   // [side][own log][threads index] -> events per second, one per round.
@@ -252,8 +252,9 @@ void ScalingReport(const EventSetup &setup, int rounds, int batch) {
       rate[side][own][n].push_back(side == 0 ? EventsPerSecond(kThreadCounts[n], batch, library(own))
                                              : EventsPerSecond(kThreadCounts[n], batch, floor(own)));
     }
-  std::printf("\nThreads recording at once: %d interleaved rounds of %d events per thread (median events/s)\n",
-              rounds, batch);
+  std::printf(
+      "\nThreads recording at once: %d interleaved rounds of %d events per thread (median events/s)\n",
+      rounds, batch);
   std::printf("  %-22s %8s %12s %8s %14s %8s %10s\n", "", "threads", "library", "x 1", "floor", "x 1",
               "of floor's");
   for (int own = 1; own >= 0; --own)
@@ -276,12 +277,13 @@ void LatencyReport(int calls) {
         while (!done.load(std::memory_order_relaxed)) oAnalyticsGameEnter(kThreadGameIds[t], kUserId);
       });
     std::vector<double> micros(static_cast<std::size_t>(calls));
-    for (double &us : micros) us = NanosecondsPerEvent(1, [] { oAnalyticsGameEnter(kThreadGameIds[0], kUserId); }) / 1000;
+    for (double &us : micros)
+      us = NanosecondsPerEvent(1, [] { oAnalyticsGameEnter(kThreadGameIds[0], kUserId); }) / 1000;
     done = true;
     for (std::thread &thread : busy) thread.join();
     std::sort(micros.begin(), micros.end());
-    std::printf("  %d other threads recording: p50 %7.1f us, p99 %7.1f us\n", others, micros[micros.size() / 2],
-                micros[micros.size() * 99 / 100]);
+    std::printf("  %d other threads recording: p50 %7.1f us, p99 %7.1f us\n", others,
+                micros[micros.size() / 2], micros[micros.size() * 99 / 100]);
   };
   std::printf("\nLatency of oAnalyticsGameEnter on one thread, %d calls\n", calls);
   percentiles(0);
@@ -298,8 +300,10 @@ void RestartWithLongCommandLine(int argc, char **argv) {
   for (int n = 0; used < kCommandLineBytes; ++n) {
     std::string filler = "--launcher-setting-" + std::to_string(n) + "=";
     const std::size_t room = kCommandLineBytes - used - 1;
-    if (room < filler.size()) filler.resize(room);
-    else filler.resize(std::min<std::size_t>(63, room), 'v');
+    if (room < filler.size())
+      filler.resize(room);
+    else
+      filler.resize(std::min<std::size_t>(63, room), 'v');
     used += filler.size() + 1;
     args.push_back(filler);
   }

@@ -49,8 +49,8 @@ int main(int argc, char **argv) {
     const std::int64_t after = orvane::bench::ResidentBytes();
     std::printf("resident memory: %lld KiB after %ld warm-up events, %lld KiB after %ld more: "
                 "growth %lld KiB\n",
-                static_cast<long long>(before / 1024), kWarmUp, static_cast<long long>(after / 1024),
-                events, static_cast<long long>((after - before) / 1024));
+                static_cast<long long>(before / 1024), kWarmUp, static_cast<long long>(after / 1024), events,
+                static_cast<long long>((after - before) / 1024));
   } else {
     ok = ok && RecordEnters(events);
   }

@@ -106,10 +106,10 @@ static int load(const char *path) {
     fprintf(stderr, "orvane-host: cannot load %s\n", path);
     return 0;
   }
-#define FIND(field, name)                                                                   \
-  if (!(*(void **)&sdk.field = find_symbol(lib, name))) {                                   \
-    fprintf(stderr, "orvane-host: %s has no export %s\n", path, name);                      \
-    return 0;                                                                               \
+#define FIND(field, name)                                                                                    \
+  if (!(*(void **)&sdk.field = find_symbol(lib, name))) {                                                    \
+    fprintf(stderr, "orvane-host: %s has no export %s\n", path, name);                                       \
+    return 0;                                                                                                \
   }
   FIND(register_for_logs, "oRegisterForLogs");
   FIND(initialize, "oInitialize");
@@ -128,8 +128,10 @@ static int load(const char *path) {
  * library's own allocator at once, empty or not: a host never frees results
  * with its own C runtime. */
 static char *show_identity(const char *name, char *result, int keep) {
-  if (result[0] == '\0') printf("%s() = \"\" (not found)\n", name);
-  else printf("%s() = \"%s\"\n", name, result);
+  if (result[0] == '\0')
+    printf("%s() = \"\" (not found)\n", name);
+  else
+    printf("%s() = \"%s\"\n", name, result);
   if (keep && result[0] != '\0') return result;
   sdk.free_text(result);
   return NULL;

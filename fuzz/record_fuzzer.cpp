@@ -34,7 +34,8 @@ std::string_view TakeValue(std::string_view &rest) {
 // Decrypts with a fresh EVP context of our own, not the library's backend,
 // and a key text built here: "OrvaneLogKey-01", the first 65 bytes of the
 // key game id, zeros to 80 bytes; key from byte 0, IV from byte 64.
-bool DecryptIndependently(const std::vector<std::uint8_t> &in, std::string_view key_game_id, std::string &plain) {
+bool DecryptIndependently(const std::vector<std::uint8_t> &in, std::string_view key_game_id,
+                          std::string &plain) {
   std::string key = "OrvaneLogKey-01" + std::string(key_game_id.substr(0, 65));
   key.resize(80, '\0');
   const auto *k = reinterpret_cast<const unsigned char *>(key.data());
@@ -63,7 +64,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   // colon names a drive or a stream on Windows, a control byte no file.
   if (orvane::IsUsableGameId(game_id))
     for (const char c : game_id)
-      if (c == '/' || c == '\\' || c == ':' || static_cast<unsigned char>(c) < 0x20) Fail("game id leaves the folder");
+      if (c == '/' || c == '\\' || c == ':' || static_cast<unsigned char>(c) < 0x20)
+        Fail("game id leaves the folder");
 
   static const std::string key_game_id(game_id);
   orvane::TakeKeyText(key_game_id.c_str());
@@ -72,8 +74,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   std::string record, hex, plain;
   orvane::AppendEventRecord(record, game_id, user_id, type, time, extra);
   std::vector<std::uint8_t> ciphertext;
-  if (!orvane::EncryptRecordText(cipher, record, hex) || !orvane::DecodeHex(hex, ciphertext)) Fail("no hex line");
-  if (!DecryptIndependently(ciphertext, key_game_id, plain) || plain != record) Fail("decrypts to another text");
+  if (!orvane::EncryptRecordText(cipher, record, hex) || !orvane::DecodeHex(hex, ciphertext))
+    Fail("no hex line");
+  if (!DecryptIndependently(ciphertext, key_game_id, plain) || plain != record)
+    Fail("decrypts to another text");
 
   const std::optional<orvane::EventRecord> parsed = orvane::ParseEventRecord(plain);
   if (parsed != orvane::EventRecord{std::string(user_id), std::string(game_id), std::string(type), time,

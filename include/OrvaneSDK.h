@@ -35,17 +35,17 @@
 #include "OrvaneSDKVersion.h"
 
 #if defined(_WIN32)
-#  define ORVANE_CALL __cdecl
-#  if defined(ORVANE_BUILDING_LIBRARY)
-#    define ORVANE_API __declspec(dllexport)
-#  elif defined(ORVANE_STATIC)
-#    define ORVANE_API
-#  else
-#    define ORVANE_API __declspec(dllimport)
-#  endif
+#define ORVANE_CALL __cdecl
+#if defined(ORVANE_BUILDING_LIBRARY)
+#define ORVANE_API __declspec(dllexport)
+#elif defined(ORVANE_STATIC)
+#define ORVANE_API
 #else
-#  define ORVANE_CALL
-#  define ORVANE_API __attribute__((visibility("default")))
+#define ORVANE_API __declspec(dllimport)
+#endif
+#else
+#define ORVANE_CALL
+#define ORVANE_API __attribute__((visibility("default")))
 #endif
 
 #ifdef __cplusplus
@@ -148,8 +148,7 @@ ORVANE_API int32_t ORVANE_CALL oAnalyticsInit(const char *gameId, const char *us
 ORVANE_API int32_t ORVANE_CALL oAnalyticsGameEnter(const char *gameId, const char *userId);
 ORVANE_API int32_t ORVANE_CALL oAnalyticsGameExit(const char *gameId, const char *userId);
 /* `extra` is the game's own text for the event, stored with it (null = ""). */
-ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char *userId,
-                                                 const char *extra);
+ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char *userId, const char *extra);
 
 /*
  * Launch identity: the text that follows "--userUuid--" (oAuthGetUserUuid) or

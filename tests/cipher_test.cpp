@@ -15,7 +15,8 @@ TEST(Cipher, KnownAnswers) {
   const struct {
     std::string key_text, record, hex;
   } vectors[] = {
-      {KeyTextFor("g1"), R"({"user_id":"u1","game_id":"g1","type":"ENTER","time":"2024-05-17T08:30:00","extra":""})",
+      {KeyTextFor("g1"),
+       R"({"user_id":"u1","game_id":"g1","type":"ENTER","time":"2024-05-17T08:30:00","extra":""})",
        "b1659727c7a378f68090dc51236637118f565656c8d9f70e68a503fc43aaea708ae947655772e282f2132e502b85a091"
        "417bd170bbbd8bac46222e07d0e1e2973775ff64bff0330386e99052b613ad63c6951b05a386434b823a218fe0c03dd5"},
       {KeyTextFor(std::string(65, 'x')),
@@ -23,7 +24,8 @@ TEST(Cipher, KnownAnswers) {
        "bffd380268c33ed3d08eb69a124d3831ff35bbae67b647d571fbdf4f32037dd98cb52a7eeffd4c226f9c751b30c0824e"
        "b96c4310f821543154b1b52d4c9dda1a930aa85471ae2992dc9aca4dd35c98d5c87377f5cd69e2d982f6af5ce4b36414"
        "5898c857f6f900202b2b18523dfe62a5"},
-      {std::string(80, '\0'), R"({"user_id":"","game_id":"","type":"EXIT","time":"1970-01-01T00:00:00","extra":""})",
+      {std::string(80, '\0'),
+       R"({"user_id":"","game_id":"","type":"EXIT","time":"1970-01-01T00:00:00","extra":""})",
        "48516d3d66dc7cf50ad8ddb80361e2a37b5697b9e7df04e1736eff01f5bddb54bba67656403acc0bf4779f13831ded0b"
        "3d1230f8c1b02ab564e440d655ddc9deafba11472ce442180d85e78f4e179a51e8b479d3a526aea47e11d20530f516ec"},
       {KeyTextFor("abcdefghijklmnopq"), "0123456789abcdef", // a whole block of padding
@@ -44,7 +46,8 @@ TEST(Cipher, KnownAnswers) {
     EXPECT_EQ(cipher::backend().decrypt(session, out.data(), out.size(), plain.data()),
               static_cast<std::ptrdiff_t>(v.record.size()));
     EXPECT_EQ(std::string(plain.begin(), plain.begin() + static_cast<long>(v.record.size())), v.record);
-    EXPECT_EQ(cipher::backend().decrypt(session, out.data(), out.size() - 1, plain.data()), -1) << "not blocks";
+    EXPECT_EQ(cipher::backend().decrypt(session, out.data(), out.size() - 1, plain.data()), -1)
+        << "not blocks";
     out.back() ^= 0x5a; // the padding no longer reads right
     EXPECT_EQ(cipher::backend().decrypt(session, out.data(), out.size(), plain.data()), -1);
     cipher::backend().close(session);
@@ -65,9 +68,8 @@ TEST(Cipher, EveryLengthDecryptsWhole) {
     EXPECT_EQ(DecryptLine(hex, key), record) << length;
   }
   const CallsGuard restore;
-  cipher::backend().encrypt = [](cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) -> std::ptrdiff_t {
-    return -1;
-  };
+  cipher::backend().encrypt = [](cipher::Session *, const std::uint8_t *, std::size_t,
+                                 std::uint8_t *) -> std::ptrdiff_t { return -1; };
   std::string hex = "kept";
   EXPECT_FALSE(EncryptRecordText(state, "{}", hex));
   EXPECT_EQ(hex, "kept");

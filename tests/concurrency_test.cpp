@@ -67,7 +67,9 @@ TEST_F(ConcurrencyTest, ThreadsAndProcessesShareLogs) {
     for (int i = 0; i < kEvents; i += 2) expected.insert(Tag('t', t, i));
     running.emplace_back([t] {
       for (int i = 0; i < kEvents; ++i)
-        EXPECT_EQ(oAnalyticsSpecial(i % 2 ? ("own-" + std::to_string(t)).c_str() : "shared", "u1", Tag('t', t, i).c_str()), 0);
+        EXPECT_EQ(oAnalyticsSpecial(i % 2 ? ("own-" + std::to_string(t)).c_str() : "shared", "u1",
+                                    Tag('t', t, i).c_str()),
+                  0);
     });
   }
   std::atomic<bool> done{false};
@@ -82,7 +84,8 @@ TEST_F(ConcurrencyTest, ThreadsAndProcessesShareLogs) {
     const std::vector<std::string> records = Log(game, {ProcessKey(), KeyTextFor("shared")});
     ASSERT_EQ(records.size(), 1u + (t < kThreads ? kEvents / 2 : expected.size())) << game;
     EXPECT_EQ(Field(records[0], "type"), "INIT") << game;
-    for (std::size_t i = 1; i < records.size() && t == kThreads; ++i) extras.insert(Field(records[i], "extra"));
+    for (std::size_t i = 1; i < records.size() && t == kThreads; ++i)
+      extras.insert(Field(records[i], "extra"));
   }
   EXPECT_EQ(extras, expected);
 }

@@ -20,8 +20,8 @@ protected:
 };
 
 std::string Rec(const std::string &type, const std::string &game, const std::string &extra = "") {
-  return "{\"user_id\":\"u1\",\"game_id\":\"" + game + "\",\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" +
-         extra + "\"}";
+  return "{\"user_id\":\"u1\",\"game_id\":\"" + game + "\",\"type\":\"" + type +
+         "\",\"time\":\"T\",\"extra\":\"" + extra + "\"}";
 }
 
 // The worked example of a new machine; the EXIT comes from an exit handler
@@ -29,30 +29,33 @@ std::string Rec(const std::string &type, const std::string &game, const std::str
 // the library may be gone yet. Argument 0 is searched like the others, and
 // UTF-8 comes back unchanged.
 TEST_F(HostTest, AGameSessionOnANewMachine) {
-  const ChildResult run = Run({"uuid", "gameid", "enter", "g1", "u1", "init", "g1", "u1", "special", "g1", "u1",
-                               "score=10", "exit-at-exit", "g1", "u1", "--", "--userUuid--j\xc3\xa9r", "--gameId--g9"},
-                              "C:\\--gameId--space race\\game.exe");
+  const ChildResult run =
+      Run({"uuid", "gameid", "enter", "g1", "u1", "init", "g1", "u1", "special", "g1", "u1", "score=10",
+           "exit-at-exit", "g1", "u1", "--", "--userUuid--j\xc3\xa9r", "--gameId--g9"},
+          "C:\\--gameId--space race\\game.exe");
   EXPECT_EQ(run.exit_code, 0) << run.output;
-  EXPECT_EQ(run.output, "oRegisterForLogs(print_message)\n"
-                        "  [0 INFO] [OrvaneSDK] Logging initiated.\n"
-                        "  [0 INFO] [OrvaneSDK] Authentication - OK\n"
-                        "oAuthGetUserUuid() = \"j\xc3\xa9r\"\n"
-                        "  [0 INFO] [OrvaneSDK] Return GameID - OK\n"
-                        "oAuthGetGameId() = \"space race\\game.exe\"\n"
-                        "  [0 INFO] [OrvaneSDK] Analytics ENTER - SDK was never initialized. Initializing the SDK.\n"
-                        "  [0 INFO] [OrvaneSDK] Initialize() - OK.\n"
-                        "  [1 WARNING] [OrvaneSDK] Analytics ENTER - log was never initialized. Initialized the game log\n"
-                        "  [0 INFO] [OrvaneSDK] Analytics INIT - OK\n"
-                        "  [0 INFO] [OrvaneSDK] Analytics ENTER - OK\n"
-                        "oAnalyticsGameEnter() = 0\n"
-                        "  [1 WARNING] [OrvaneSDK] Analytics INIT - log had been already initialized.\n"
-                        "oAnalyticsInit() = 0\n"
-                        "  [0 INFO] [OrvaneSDK] Analytics SPECIAL - OK\n"
-                        "oAnalyticsSpecial() = 0\n"
-                        "  [0 INFO] [OrvaneSDK] Analytics EXIT - OK\n"
-                        "oAnalyticsGameExit() = 0\n");
+  EXPECT_EQ(
+      run.output,
+      "oRegisterForLogs(print_message)\n"
+      "  [0 INFO] [OrvaneSDK] Logging initiated.\n"
+      "  [0 INFO] [OrvaneSDK] Authentication - OK\n"
+      "oAuthGetUserUuid() = \"j\xc3\xa9r\"\n"
+      "  [0 INFO] [OrvaneSDK] Return GameID - OK\n"
+      "oAuthGetGameId() = \"space race\\game.exe\"\n"
+      "  [0 INFO] [OrvaneSDK] Analytics ENTER - SDK was never initialized. Initializing the SDK.\n"
+      "  [0 INFO] [OrvaneSDK] Initialize() - OK.\n"
+      "  [1 WARNING] [OrvaneSDK] Analytics ENTER - log was never initialized. Initialized the game log\n"
+      "  [0 INFO] [OrvaneSDK] Analytics INIT - OK\n"
+      "  [0 INFO] [OrvaneSDK] Analytics ENTER - OK\n"
+      "oAnalyticsGameEnter() = 0\n"
+      "  [1 WARNING] [OrvaneSDK] Analytics INIT - log had been already initialized.\n"
+      "oAnalyticsInit() = 0\n"
+      "  [0 INFO] [OrvaneSDK] Analytics SPECIAL - OK\n"
+      "oAnalyticsSpecial() = 0\n"
+      "  [0 INFO] [OrvaneSDK] Analytics EXIT - OK\n"
+      "oAnalyticsGameExit() = 0\n");
   EXPECT_EQ(Log("g1", "g1"), (std::vector<std::string>{Rec("INIT", "g1"), Rec("ENTER", "g1"),
-                                                        Rec("SPECIAL", "g1", "score=10"), Rec("EXIT", "g1")}));
+                                                       Rec("SPECIAL", "g1", "score=10"), Rec("EXIT", "g1")}));
 }
 
 // A process encrypts every game's log under the first game id it was given,

@@ -22,9 +22,11 @@ TEST(CommandLine, FindsTheRestOfTheFirstArgumentWithTheMarker) {
   };
   const std::u16string exe = Units("demo.exe");
   const Case cases[] = {
-      {"both markers", List({Units("C:\\Games\\Demo\\demo.exe"), Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}),
+      {"both markers",
+       List({Units("C:\\Games\\Demo\\demo.exe"), Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}),
        kUserUuidMarker, "a1b2c3d4"},
-      {"game id", List({Units("C:\\Games\\Demo\\demo.exe"), Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}),
+      {"game id",
+       List({Units("C:\\Games\\Demo\\demo.exe"), Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}),
        kGameIdMarker, "demo42"},
       {"absent marker", List({exe, Units("--gameId--space-race-championship")}), kUserUuidMarker, ""},
       {"bare marker, value in the next argument", List({exe, Units("--userUuid--"), Units("a1b2c3d4")}),
@@ -33,7 +35,8 @@ TEST(CommandLine, FindsTheRestOfTheFirstArgumentWithTheMarker) {
        List({exe, Units("--gameId--"), Units("--gameId--g9")}), kGameIdMarker, ""},
       {"another marker inside the value", List({exe, Units("--userUuid--u7--gameId--g9")}), kUserUuidMarker,
        "u7--gameId--g9"},
-      {"the other marker found inside", List({exe, Units("--userUuid--u7--gameId--g9")}), kGameIdMarker, "g9"},
+      {"the other marker found inside", List({exe, Units("--userUuid--u7--gameId--g9")}), kGameIdMarker,
+       "g9"},
       {"lowest index wins", List({exe, Units("--gameId--first"), Units("--gameId--second")}), kGameIdMarker,
        "first"},
       {"text before the marker", List({exe, Units("/opt:--gameId--g9")}), kGameIdMarker, "g9"},
@@ -45,15 +48,14 @@ TEST(CommandLine, FindsTheRestOfTheFirstArgumentWithTheMarker) {
       {"shorter than the marker", List({Units("--game")}), kGameIdMarker, ""},
       {"U+00E9 narrows to one byte", List({exe, u"--gameId--caf\u00e9"}), kGameIdMarker, "caf\xe9"},
       {"U+0141 narrows to A", List({exe, u"--gameId--\u0141x"}), kGameIdMarker, "Ax"},
-      {"U+4E2D narrows to a hyphen and spells the marker",
-       List({exe, u"\u4e2d\u4e2duserUuid\u4e2d\u4e2dx"}), kUserUuidMarker, "x"},
+      {"U+4E2D narrows to a hyphen and spells the marker", List({exe, u"\u4e2d\u4e2duserUuid\u4e2d\u4e2dx"}),
+       kUserUuidMarker, "x"},
       {"a surrogate pair gives two bytes", List({exe, u"--gameId--\U0001F600"}), kGameIdMarker,
        std::string("\x3d\x00", 2)},
       {"a zero unit stays inside the value", List({exe, std::u16string(u"--gameId--a\0b", 13)}),
        kGameIdMarker, std::string("a\0b", 3)},
   };
-  for (const Case &c : cases)
-    EXPECT_EQ(FindValueAfterMarker(c.args, c.marker), c.value) << c.name;
+  for (const Case &c : cases) EXPECT_EQ(FindValueAfterMarker(c.args, c.marker), c.value) << c.name;
 }
 
 platform::ArgumentList g_args;
@@ -74,15 +76,27 @@ TEST_F(SandboxTest, IdentityResultsAndMessages) {
     std::string game_id;
     std::vector<Message> messages;
   };
-  const Message uuid_ok{0, "[OrvaneSDK] Authentication - OK"}, uuid_failed{2, "[OrvaneSDK] Authentication - Failed"};
-  const Message game_ok{0, "[OrvaneSDK] Return GameID - OK"}, game_empty{2, "[OrvaneSDK] Return GameID - Empty"};
+  const Message uuid_ok{0, "[OrvaneSDK] Authentication - OK"},
+      uuid_failed{2, "[OrvaneSDK] Authentication - Failed"};
+  const Message game_ok{0, "[OrvaneSDK] Return GameID - OK"},
+      game_empty{2, "[OrvaneSDK] Return GameID - Empty"};
   const std::u16string exe = Units("demo.exe");
   const Case cases[] = {
-      {List({exe, Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}), true, "a1b2c3d4", "demo42",
+      {List({exe, Units("--userUuid--a1b2c3d4"), Units("--gameId--demo42")}),
+       true,
+       "a1b2c3d4",
+       "demo42",
        {uuid_ok, game_ok, game_ok}},
-      {List({exe, Units("--userUuid--"), Units("--gameId--")}), true, "", "", {uuid_failed, game_empty, game_empty}},
+      {List({exe, Units("--userUuid--"), Units("--gameId--")}),
+       true,
+       "",
+       "",
+       {uuid_failed, game_empty, game_empty}},
       {List({exe, Units("--gameId--z")}), false, "", "", {}}, // the split fails: no message
-      {List({exe, u"--userUuid--\u0100abc", std::u16string(u"--gameId--ab\0cd", 15)}), true, "", "ab",
+      {List({exe, u"--userUuid--\u0100abc", std::u16string(u"--gameId--ab\0cd", 15)}),
+       true,
+       "",
+       "ab",
        {uuid_failed, game_ok, game_ok}}, // a value that reads empty is none; the text ends at a zero byte
   };
   for (const Case &c : cases) {

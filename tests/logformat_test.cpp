@@ -10,11 +10,15 @@ namespace {
 
 TEST(LogFormat, TimeStampOfFixedInstants) {
   const std::pair<std::int64_t, const char *> cases[] = {
-      {0, "1970-01-01T00:00:00"},           {1700000000, "2023-11-14T22:13:20"},
-      {1709622489, "2024-03-05T07:08:09"},  {1704067199, "2023-12-31T23:59:59"},
-      {1704067200, "2024-01-01T00:00:00"},  {951782400, "2000-02-29T00:00:00"},
-      {1704067140, "2023-12-31T23:59:00"},  // minute 59: seconds of the hour / 60, not 61
-      {4107542400, "2100-03-01T00:00:00"},  {-1, "1969-12-31T23:59:59"},
+      {0, "1970-01-01T00:00:00"},
+      {1700000000, "2023-11-14T22:13:20"},
+      {1709622489, "2024-03-05T07:08:09"},
+      {1704067199, "2023-12-31T23:59:59"},
+      {1704067200, "2024-01-01T00:00:00"},
+      {951782400, "2000-02-29T00:00:00"},
+      {1704067140, "2023-12-31T23:59:00"}, // minute 59: seconds of the hour / 60, not 61
+      {4107542400, "2100-03-01T00:00:00"},
+      {-1, "1969-12-31T23:59:59"},
       {253402300800, "10000-01-01T00:00:00"}, // a fifth digit is kept, not cut
   };
   TimestampCache cache;
@@ -24,7 +28,8 @@ TEST(LogFormat, TimeStampOfFixedInstants) {
   }
 }
 
-std::string Record(std::string_view game, std::string_view user, std::string_view type, std::string_view extra) {
+std::string Record(std::string_view game, std::string_view user, std::string_view type,
+                   std::string_view extra) {
   std::string out = "kept:";
   AppendEventRecord(out, game, user, type, "2024-05-17T08:30:00", extra);
   return out;

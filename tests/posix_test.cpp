@@ -45,8 +45,10 @@ TEST_F(PosixTest, OnlyARegularFileIsALog) {
     SCOPED_TRACE(game);
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameEnter(game, "u1"), -1);
-    EXPECT_EQ(Captured(), (std::vector<Message>{{2, std::string("[OrvaneSDK] Analytics ENTER - log file failed "
-                                                                "to open. Maybe a bad game_id (") + game + ")?"}}));
+    EXPECT_EQ(Captured(),
+              (std::vector<Message>{{2, std::string("[OrvaneSDK] Analytics ENTER - log file failed "
+                                                    "to open. Maybe a bad game_id (") +
+                                            game + ")?"}}));
   }
   EXPECT_EQ(ReadFile(outside), "kept");
   EXPECT_FALSE(std::filesystem::exists(base_ + "/planted"));

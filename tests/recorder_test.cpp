@@ -19,12 +19,18 @@ protected:
 };
 
 std::string Rec(const std::string &type, const std::string &extra = "", const std::string &user = "u1") {
-  return "{\"user_id\":\"" + user + "\",\"game_id\":\"g1\",\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" +
-         extra + "\"}";
+  return "{\"user_id\":\"" + user + "\",\"game_id\":\"g1\",\"type\":\"" + type +
+         "\",\"time\":\"T\",\"extra\":\"" + extra + "\"}";
 }
-Message Info(const std::string &type, const char *text) { return {0, "[OrvaneSDK] Analytics " + type + " - " + text}; }
-Message Warn(const std::string &type, const char *text) { return {1, "[OrvaneSDK] Analytics " + type + " - " + text}; }
-Message Err(const std::string &type, const std::string &text) { return {2, "[OrvaneSDK] Analytics " + type + " - " + text}; }
+Message Info(const std::string &type, const char *text) {
+  return {0, "[OrvaneSDK] Analytics " + type + " - " + text};
+}
+Message Warn(const std::string &type, const char *text) {
+  return {1, "[OrvaneSDK] Analytics " + type + " - " + text};
+}
+Message Err(const std::string &type, const std::string &text) {
+  return {2, "[OrvaneSDK] Analytics " + type + " - " + text};
+}
 const Message kInitializeOk{0, "[OrvaneSDK] Initialize() - OK."};
 const Message kNeverInitialized = Warn("ENTER", "log was never initialized. Initialized the game log");
 
@@ -34,8 +40,10 @@ const Message kNeverInitialized = Warn("ENTER", "log was never initialized. Init
 bool g_reenter = false;
 void ORVANE_CALL RecordFromInside(LogLevel level, const char *message) {
   CaptureMessage(level, message);
-  if (g_reenter && std::string_view(message).ends_with("ENTER - log was never initialized. Initialized the game log"))
-    g_reenter = false, CaptureMessage(LogLevel::Info, oAnalyticsGameExit("g1", "u1") == 0 ? "nested 0" : "nested -1");
+  if (g_reenter &&
+      std::string_view(message).ends_with("ENTER - log was never initialized. Initialized the game log"))
+    g_reenter = false,
+    CaptureMessage(LogLevel::Info, oAnalyticsGameExit("g1", "u1") == 0 ? "nested 0" : "nested -1");
 }
 
 TEST_F(RecorderTest, ALogFromItsFirstEventOn) {
@@ -43,9 +51,14 @@ TEST_F(RecorderTest, ALogFromItsFirstEventOn) {
   oRegisterForLogs(RecordFromInside);
   Captured().clear();
   EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  EXPECT_EQ(Captured(), (std::vector<Message>{Info("ENTER", "SDK was never initialized. Initializing the SDK."),
-                                              kInitializeOk, kNeverInitialized, Info("EXIT", "OK"), {0, "nested 0"},
-                                              Info("INIT", "OK"), Info("ENTER", "OK")}));
+  EXPECT_EQ(Captured(),
+            (std::vector<Message>{Info("ENTER", "SDK was never initialized. Initializing the SDK."),
+                                  kInitializeOk,
+                                  kNeverInitialized,
+                                  Info("EXIT", "OK"),
+                                  {0, "nested 0"},
+                                  Info("INIT", "OK"),
+                                  Info("ENTER", "OK")}));
   EXPECT_EQ(Split(*ReadFile(LogPath("g1")), "\n").size(), 3u) << "line breaks only between lines";
   Captured().clear();
   EXPECT_EQ(oAnalyticsInit("g1", "u1"), 0);
@@ -79,8 +92,9 @@ TEST_F(RecorderTest, InitStartsAnEmptyLogOnly) {
 // A refused call sends one Error and touches nothing; control bytes of a game
 // id are shown as \xNN, so that an id cannot forge lines in the host's log.
 TEST_F(RecorderTest, RefusedCallsTouchNothing) {
-  const std::pair<const char *, const char *> refused[] = {
-      {nullptr, "failed. Game id is empty"}, {"", "failed. Game id is empty"}, {"g1", "failed. User id is empty"}};
+  const std::pair<const char *, const char *> refused[] = {{nullptr, "failed. Game id is empty"},
+                                                           {"", "failed. Game id is empty"},
+                                                           {"g1", "failed. User id is empty"}};
   for (const auto &[game, text] : refused) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameEnter(game, game ? nullptr : ""), -1);
@@ -88,13 +102,21 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
   }
   std::filesystem::create_directories(where_.logs);
   const std::pair<std::string, std::string> hostile[] = {
-      {"../x", "../x"}, {"..\\x", "..\\x"}, {"..", ".."}, {"CON", "CON"}, {"nul.txt", "nul.txt"},
-      {"a|b", "a|b"}, {"x.", "x."}, {"/abs", "/abs"}, {"t\tb\x7f", "t\\x09b\\x7f"},
+      {"../x", "../x"},
+      {"..\\x", "..\\x"},
+      {"..", ".."},
+      {"CON", "CON"},
+      {"nul.txt", "nul.txt"},
+      {"a|b", "a|b"},
+      {"x.", "x."},
+      {"/abs", "/abs"},
+      {"t\tb\x7f", "t\\x09b\\x7f"},
       {"x\n[OrvaneSDK] y - OK\x1b[2K", "x\\x0a[OrvaneSDK] y - OK\\x1b[2K"}};
   for (const auto &[id, shown] : hostile) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsInit(id.c_str(), "u1"), -1);
-    EXPECT_EQ(Captured(), std::vector<Message>{Err("INIT", "log file failed to open. Maybe a bad game_id (" + shown + ")?")});
+    EXPECT_EQ(Captured(), std::vector<Message>{
+                              Err("INIT", "log file failed to open. Maybe a bad game_id (" + shown + ")?")});
   }
   EXPECT_TRUE(std::filesystem::is_empty(where_.logs));
   EXPECT_EQ(std::distance(std::filesystem::recursive_directory_iterator(base_), {}), 3);
@@ -125,7 +147,9 @@ bool ShortAppend(platform::FileHandle f, const void *d, std::size_t n) { // a fu
 bool ThrowingAppend(platform::FileHandle, const void *, std::size_t) { throw std::bad_alloc(); }
 bool FailingClose(platform::FileHandle f) { return Os().close_file(f) && Spend(); }
 bool FailingMakeDirectory(const char *) { return false; }
-std::ptrdiff_t FailingEncrypt(cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) { return -1; }
+std::ptrdiff_t FailingEncrypt(cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) {
+  return -1;
+}
 // Another writer holds the lock past the wait; time moves 100 ms per reading
 // of the clock, however short the pauses.
 int g_lock_tries;
@@ -159,32 +183,81 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
   };
   const std::string open_failed = "log file failed to open. Maybe a bad game_id (g1)?";
   const Case cases[] = {
-      {"open fails", true, [] { platform::calls().open_log = FailingOpen; }, -1, {Err("ENTER", open_failed)}, {Rec("INIT")}},
-      {"open fails while another process makes the directory: tried again", false,
-       [] { std::filesystem::remove_all(g_logs), platform::calls().open_log = OpenRacingAnotherProcess; }, 0,
-       {kNeverInitialized, Info("INIT", "OK"), Info("ENTER", "OK")}, {Rec("INIT"), Rec("ENTER")}},
-      {"storage cannot be made", false,
-       [] { std::filesystem::remove_all(g_logs), platform::calls().make_directory = FailingMakeDirectory; }, -1,
-       {Info("ENTER", "SDK was never initialized. Initializing the SDK."), {2, "[OrvaneSDK] Initialize() - failed."},
-        Err("ENTER", open_failed)}, {}},
-      {"write fails: the fragment stays apart", true, [] { platform::calls().append = ShortAppend; }, -1,
-       {Err("ENTER", "log file failed to write.")}, {Rec("INIT"), "(undecryptable)"}},
-      {"first write fails: cut back, so no log starts without INIT", false, [] { platform::calls().append = ShortAppend; },
-       -1, {kNeverInitialized, Err("INIT", "log file failed to write."), Err("ENTER", "log file failed to write.")}, {}},
-      {"close fails", true, [] { platform::calls().close_file = FailingClose; }, -1,
-       {Err("ENTER", "log file failed to write.")}, {Rec("INIT"), Rec("ENTER")}},
-      {"cipher fails", true, [] { cipher::backend().encrypt = FailingEncrypt; }, -1,
-       {Err("ENTER", "failed. Record encryption failed.")}, {Rec("INIT")}},
-      {"size unknown counts as not empty", false, [] { platform::calls().open_log = OpenOfUnknownSize; }, 0,
-       {Info("ENTER", "OK")}, {"(undecryptable)", Rec("ENTER")}},
-      {"empty log locked by another writer past the deadline", false, [] { InjectBusyLock(BusyLock); }, -1,
-       {Err("ENTER", "log file is locked by another process.")}, {}},
-      {"another writer starts the log during the wait: after a line break", false,
-       [] { InjectBusyLock(RivalStartsTheLog); }, 0, {Info("ENTER", "OK")}, {"(undecryptable)", Rec("ENTER")}},
-      {"another writer starts the log before the lock is had", false, [] { InjectBusyLock(RivalStartsTheLogThenYields); },
-       0, {Info("ENTER", "OK")}, {"(undecryptable)", Rec("ENTER")}},
-      {"an exception under the lock gives lock and file back", false, [] { platform::calls().append = ThrowingAppend; },
-       -1, {kNeverInitialized, Err("ENTER", "failed. Internal error.")}, {}},
+      {"open fails",
+       true,
+       [] { platform::calls().open_log = FailingOpen; },
+       -1,
+       {Err("ENTER", open_failed)},
+       {Rec("INIT")}},
+      {"open fails while another process makes the directory: tried again",
+       false,
+       [] { std::filesystem::remove_all(g_logs), platform::calls().open_log = OpenRacingAnotherProcess; },
+       0,
+       {kNeverInitialized, Info("INIT", "OK"), Info("ENTER", "OK")},
+       {Rec("INIT"), Rec("ENTER")}},
+      {"storage cannot be made",
+       false,
+       [] { std::filesystem::remove_all(g_logs), platform::calls().make_directory = FailingMakeDirectory; },
+       -1,
+       {Info("ENTER", "SDK was never initialized. Initializing the SDK."),
+        {2, "[OrvaneSDK] Initialize() - failed."},
+        Err("ENTER", open_failed)},
+       {}},
+      {"write fails: the fragment stays apart",
+       true,
+       [] { platform::calls().append = ShortAppend; },
+       -1,
+       {Err("ENTER", "log file failed to write.")},
+       {Rec("INIT"), "(undecryptable)"}},
+      {"first write fails: cut back, so no log starts without INIT",
+       false,
+       [] { platform::calls().append = ShortAppend; },
+       -1,
+       {kNeverInitialized, Err("INIT", "log file failed to write."),
+        Err("ENTER", "log file failed to write.")},
+       {}},
+      {"close fails",
+       true,
+       [] { platform::calls().close_file = FailingClose; },
+       -1,
+       {Err("ENTER", "log file failed to write.")},
+       {Rec("INIT"), Rec("ENTER")}},
+      {"cipher fails",
+       true,
+       [] { cipher::backend().encrypt = FailingEncrypt; },
+       -1,
+       {Err("ENTER", "failed. Record encryption failed.")},
+       {Rec("INIT")}},
+      {"size unknown counts as not empty",
+       false,
+       [] { platform::calls().open_log = OpenOfUnknownSize; },
+       0,
+       {Info("ENTER", "OK")},
+       {"(undecryptable)", Rec("ENTER")}},
+      {"empty log locked by another writer past the deadline",
+       false,
+       [] { InjectBusyLock(BusyLock); },
+       -1,
+       {Err("ENTER", "log file is locked by another process.")},
+       {}},
+      {"another writer starts the log during the wait: after a line break",
+       false,
+       [] { InjectBusyLock(RivalStartsTheLog); },
+       0,
+       {Info("ENTER", "OK")},
+       {"(undecryptable)", Rec("ENTER")}},
+      {"another writer starts the log before the lock is had",
+       false,
+       [] { InjectBusyLock(RivalStartsTheLogThenYields); },
+       0,
+       {Info("ENTER", "OK")},
+       {"(undecryptable)", Rec("ENTER")}},
+      {"an exception under the lock gives lock and file back",
+       false,
+       [] { platform::calls().append = ThrowingAppend; },
+       -1,
+       {kNeverInitialized, Err("ENTER", "failed. Internal error.")},
+       {}},
   };
   for (const Case &c : cases) {
     SCOPED_TRACE(c.name);

@@ -2,10 +2,10 @@
 
 #include "analytics/game_id.h"
 #include "analytics/record_cipher.h"
+#include "core/storage.h"
 #include "logformat/record_text.h"
 #include "logformat/timestamp.h"
 #include "platform/platform.h"
-#include "core/storage.h"
 
 #include <atomic>
 #include <string>
@@ -13,20 +13,20 @@
 
 namespace orvane {
 
-#define ORVANE_EVENT_TYPE(TYPE, EXTRA)                                                        \
-  {                                                                                           \
-    TYPE, EXTRA, "[OrvaneSDK] Analytics " TYPE " - OK",                                       \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Game id is empty",                          \
-        "[OrvaneSDK] Analytics " TYPE " - failed. User id is empty",                          \
-        "[OrvaneSDK] Analytics " TYPE " - SDK was never initialized. Initializing the SDK.",  \
-        "[OrvaneSDK] Analytics " TYPE " - log file failed to open. Maybe a bad game_id (",    \
-        "[OrvaneSDK] Analytics " TYPE " - log had been already initialized.",                 \
-        "[OrvaneSDK] Analytics " TYPE " - log was never initialized. Initialized the game log", \
-        "[OrvaneSDK] Analytics " TYPE " - log file failed to write.",                         \
-        "[OrvaneSDK] Analytics " TYPE " - log file is locked by another process.",            \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Record encryption failed.",                 \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Record too large.",                         \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Internal error."                            \
+#define ORVANE_EVENT_TYPE(TYPE, EXTRA)                                                                       \
+  {                                                                                                          \
+    TYPE, EXTRA, "[OrvaneSDK] Analytics " TYPE " - OK",                                                      \
+        "[OrvaneSDK] Analytics " TYPE " - failed. Game id is empty",                                         \
+        "[OrvaneSDK] Analytics " TYPE " - failed. User id is empty",                                         \
+        "[OrvaneSDK] Analytics " TYPE " - SDK was never initialized. Initializing the SDK.",                 \
+        "[OrvaneSDK] Analytics " TYPE " - log file failed to open. Maybe a bad game_id (",                   \
+        "[OrvaneSDK] Analytics " TYPE " - log had been already initialized.",                                \
+        "[OrvaneSDK] Analytics " TYPE " - log was never initialized. Initialized the game log",              \
+        "[OrvaneSDK] Analytics " TYPE " - log file failed to write.",                                        \
+        "[OrvaneSDK] Analytics " TYPE " - log file is locked by another process.",                           \
+        "[OrvaneSDK] Analytics " TYPE " - failed. Record encryption failed.",                                \
+        "[OrvaneSDK] Analytics " TYPE " - failed. Record too large.",                                        \
+        "[OrvaneSDK] Analytics " TYPE " - failed. Internal error."                                           \
   }
 
 const EventType kInitEvent = ORVANE_EVENT_TYPE("INIT", false);

@@ -37,10 +37,16 @@ bool IsUsableGameId(std::string_view game_id) {
   for (char c : game_id) {
     if (static_cast<unsigned char>(c) < 0x20) return false;
     switch (c) {
-    case '/': case '\\': case ':': case '*': case '?': case '"': case '<': case '>': case '|':
-      return false;
-    default:
-      break;
+    case '/':
+    case '\\':
+    case ':':
+    case '*':
+    case '?':
+    case '"':
+    case '<':
+    case '>':
+    case '|': return false;
+    default: break;
     }
   }
   // Windows drops a trailing dot or blank, so "a." would write to "a".

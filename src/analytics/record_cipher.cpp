@@ -6,7 +6,6 @@
 #include <cstring>
 #include <mutex>
 
-
 namespace orvane {
 namespace {
 
@@ -41,15 +40,15 @@ bool EncryptRecordText(RecordCipher &state, std::string_view record, std::string
   const void *taken = g_key_ready.load(std::memory_order_acquire) ? g_key_block.keyTextTaken : nullptr;
   if (state.session == nullptr || state.prepared_for != taken) {
     if (state.session != nullptr) backend.close(state.session);
-    state.session = backend.open(g_key_block.keyText.data() + kKeyOffset,
-                                 g_key_block.keyText.data() + kIvOffset);
+    state.session =
+        backend.open(g_key_block.keyText.data() + kKeyOffset, g_key_block.keyText.data() + kIvOffset);
     state.prepared_for = taken;
     if (state.session == nullptr) return false;
   }
   state.ciphertext.resize(cipher::CiphertextSize(record.size()));
   const std::ptrdiff_t size =
-      backend.encrypt(state.session, reinterpret_cast<const std::uint8_t *>(record.data()),
-                      record.size(), state.ciphertext.data());
+      backend.encrypt(state.session, reinterpret_cast<const std::uint8_t *>(record.data()), record.size(),
+                      state.ciphertext.data());
   if (size < 0) return false;
   AppendHex(hex, state.ciphertext.data(), static_cast<std::size_t>(size));
   return true;

@@ -2,8 +2,8 @@
 // every C++ exception inside the library, then deliver the messages.
 #pragma once
 
-#include "platform/platform.h"
 #include "core/log_channel.h"
+#include "platform/platform.h"
 
 #include <utility>
 

@@ -28,8 +28,7 @@ ORVANE_API int32_t ORVANE_CALL oAnalyticsGameExit(const char *gameId, const char
   return Record(orvane::kExitEvent, gameId, userId, nullptr);
 }
 
-ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char *userId,
-                                                 const char *extra) {
+ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char *userId, const char *extra) {
   return Record(orvane::kSpecialEvent, gameId, userId, extra);
 }
 

@@ -1,18 +1,17 @@
 // Exports of the launch identity.
 #include "OrvaneSDK.h"
-#include "identity/command_line.h"
-#include "core/empty_text.h"
 #include "api/export_guard.h"
+#include "core/empty_text.h"
+#include "identity/command_line.h"
 
 #include <cstdlib>
 
 namespace {
 
 char *LookUp(const orvane::IdentityLookup &lookup) {
-  return orvane::RunExport<char *>(const_cast<char *>(orvane::kEmptyText), lookup.not_found,
-                                   [&](orvane::MessageBatch &messages) {
-                                     return orvane::LookUpIdentity(messages, lookup);
-                                   });
+  return orvane::RunExport<char *>(
+      const_cast<char *>(orvane::kEmptyText), lookup.not_found,
+      [&](orvane::MessageBatch &messages) { return orvane::LookUpIdentity(messages, lookup); });
 }
 
 } // namespace

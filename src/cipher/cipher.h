@@ -27,13 +27,11 @@ struct Backend {
   // Encrypts `size` bytes into `out` (room for CiphertextSize(size) bytes).
   // Returns the bytes written, or -1 after printing the reason to standard
   // error.
-  std::ptrdiff_t (*encrypt)(Session *session, const std::uint8_t *in, std::size_t size,
-                            std::uint8_t *out);
+  std::ptrdiff_t (*encrypt)(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out);
   // Decrypts whole blocks into `out` (room for `size` + 16 bytes) and strips the
   // padding. Returns the plaintext size, or -1 for a wrong length or bad
   // padding; prints nothing, since a damaged line is the reader's business.
-  std::ptrdiff_t (*decrypt)(Session *session, const std::uint8_t *in, std::size_t size,
-                            std::uint8_t *out);
+  std::ptrdiff_t (*decrypt)(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out);
 };
 
 // The live table; tests replace entries to make the cipher fail.

@@ -53,8 +53,7 @@ Session *OpenCng(const std::uint8_t *key, const std::uint8_t *iv) {
       Succeeded(::BCryptOpenAlgorithmProvider(&session->algorithm, BCRYPT_AES_ALGORITHM, nullptr, 0),
                 "BCryptOpenAlgorithmProvider") &&
       Succeeded(::BCryptSetProperty(session->algorithm, BCRYPT_CHAINING_MODE,
-                                    reinterpret_cast<PUCHAR>(const_cast<wchar_t *>(kCbc)),
-                                    sizeof kCbc, 0),
+                                    reinterpret_cast<PUCHAR>(const_cast<wchar_t *>(kCbc)), sizeof kCbc, 0),
                 "BCryptSetProperty(ChainingModeCBC)") &&
       Succeeded(::BCryptGenerateSymmetricKey(session->algorithm, &session->key, nullptr, 0,
                                              const_cast<PUCHAR>(key), kKeySize, 0),
@@ -66,8 +65,7 @@ Session *OpenCng(const std::uint8_t *key, const std::uint8_t *iv) {
   return session;
 }
 
-std::ptrdiff_t EncryptCng(Session *session, const std::uint8_t *in, std::size_t size,
-                          std::uint8_t *out) {
+std::ptrdiff_t EncryptCng(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
   if (size > static_cast<std::size_t>(LONG_MAX) - 2 * kBlockSize) {
     std::fprintf(stderr, "OrvaneSDK: BCryptEncrypt refused: record of %zu bytes\n", size);
     return -1;
@@ -80,24 +78,22 @@ std::ptrdiff_t EncryptCng(Session *session, const std::uint8_t *in, std::size_t 
   const ULONG room = static_cast<ULONG>(CiphertextSize(size));
   ULONG written = 0;
   if (!Succeeded(::BCryptEncrypt(session->key, const_cast<PUCHAR>(size ? in : &nothing),
-                                 static_cast<ULONG>(size), nullptr, iv, kIvSize, out, room,
-                                 &written, BCRYPT_BLOCK_PADDING),
+                                 static_cast<ULONG>(size), nullptr, iv, kIvSize, out, room, &written,
+                                 BCRYPT_BLOCK_PADDING),
                  "BCryptEncrypt"))
     return -1;
   return static_cast<std::ptrdiff_t>(written);
 }
 
-std::ptrdiff_t DecryptCng(Session *session, const std::uint8_t *in, std::size_t size,
-                          std::uint8_t *out) {
-  if (size == 0 || size % kBlockSize != 0 || size > static_cast<std::size_t>(LONG_MAX / 2))
-    return -1;
+std::ptrdiff_t DecryptCng(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
+  if (size == 0 || size % kBlockSize != 0 || size > static_cast<std::size_t>(LONG_MAX / 2)) return -1;
   std::uint8_t iv[kIvSize];
   std::memcpy(iv, session->iv, kIvSize);
   ULONG written = 0;
   // A damaged line (bad padding) is the reader's business: nothing printed.
-  if (!Succeeded(::BCryptDecrypt(session->key, const_cast<PUCHAR>(in), static_cast<ULONG>(size),
-                                 nullptr, iv, kIvSize, out, static_cast<ULONG>(size + kBlockSize),
-                                 &written, BCRYPT_BLOCK_PADDING),
+  if (!Succeeded(::BCryptDecrypt(session->key, const_cast<PUCHAR>(in), static_cast<ULONG>(size), nullptr, iv,
+                                 kIvSize, out, static_cast<ULONG>(size + kBlockSize), &written,
+                                 BCRYPT_BLOCK_PADDING),
                  nullptr))
     return -1;
   return static_cast<std::ptrdiff_t>(written);

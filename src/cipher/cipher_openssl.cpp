@@ -1,8 +1,8 @@
 // Record cipher on OpenSSL's libcrypto (EVP interface).
 #include "cipher/cipher.h"
 
-#include <openssl/err.h>
 #include <openssl/crypto.h>
+#include <openssl/err.h>
 #include <openssl/evp.h>
 
 #include <cstdio>
@@ -67,8 +67,7 @@ Session *OpenOpenSsl(const std::uint8_t *key, const std::uint8_t *iv) {
 // last block: CBC then encrypts IV xor block, exactly as a fresh context
 // would. The padded record is built in `out` and encrypted in place, which
 // the EVP interface allows.
-std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size,
-                              std::uint8_t *out) {
+std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
   EVP_CIPHER_CTX *ctx = session->encrypt;
   if (size > static_cast<std::size_t>(INT32_MAX - 2 * kBlockSize)) return -1;
   if (!session->chain_known) {
@@ -95,12 +94,10 @@ std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
   return written;
 }
 
-std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size,
-                              std::uint8_t *out) {
+std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
   EVP_CIPHER_CTX *ctx = session->decrypt;
   int first = 0, second = 0;
-  if (size == 0 || size % kBlockSize != 0 || size > static_cast<std::size_t>(INT32_MAX / 2))
-    return -1;
+  if (size == 0 || size % kBlockSize != 0 || size > static_cast<std::size_t>(INT32_MAX / 2)) return -1;
   // The padding check writes nothing past `size`: OpenSSL holds back the last
   // block until the final call.
   bool ok = EVP_DecryptInit_ex(ctx, nullptr, nullptr, nullptr, session->iv) == 1 &&

@@ -28,8 +28,10 @@ thread_local int t_deliveries = 0;
 // callback from costing a whole core.
 void WaitForOtherDeliveries() noexcept {
   for (int round = 0; g_deliveries.load(std::memory_order_seq_cst) != t_deliveries; ++round) {
-    if (round < 100) std::this_thread::yield();
-    else std::this_thread::sleep_for(std::chrono::microseconds(200));
+    if (round < 100)
+      std::this_thread::yield();
+    else
+      std::this_thread::sleep_for(std::chrono::microseconds(200));
   }
 }
 

@@ -29,9 +29,7 @@ void SetStorageForTesting(platform::StorageLocation where) {
   g_storage.store(slot, std::memory_order_release);
 }
 
-bool DirectoryExists(const char *path) {
-  return path[0] != '\0' && platform::calls().directory_exists(path);
-}
+bool DirectoryExists(const char *path) { return path[0] != '\0' && platform::calls().directory_exists(path); }
 
 void InitializeStorage(MessageBatch &messages) {
   const platform::StorageLocation &where = Storage();

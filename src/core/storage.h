@@ -2,8 +2,8 @@
 // them.
 #pragma once
 
-#include "platform/platform.h"
 #include "core/log_channel.h"
+#include "platform/platform.h"
 
 namespace orvane {
 

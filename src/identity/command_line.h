@@ -2,8 +2,8 @@
 // each as a marker followed directly by its value inside one argument.
 #pragma once
 
-#include "platform/platform.h"
 #include "core/log_channel.h"
+#include "platform/platform.h"
 
 #include <string>
 #include <string_view>

@@ -43,7 +43,8 @@ void HexBlock(char *out, const std::uint8_t *bytes) {
 constexpr std::array<std::int8_t, 256> kHexValue = [] {
   std::array<std::int8_t, 256> value{};
   value.fill(-1);
-  for (int c = 0; c < 16; ++c) value[static_cast<unsigned char>("0123456789abcdef"[c])] = static_cast<std::int8_t>(c);
+  for (int c = 0; c < 16; ++c)
+    value[static_cast<unsigned char>("0123456789abcdef"[c])] = static_cast<std::int8_t>(c);
   return value;
 }();
 

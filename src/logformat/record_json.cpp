@@ -106,8 +106,7 @@ bool ReadString(Cursor &in, std::string &value) {
       AppendUtf8(value, *code);
       break;
     }
-    default:
-      return false;
+    default: return false;
     }
   }
 }

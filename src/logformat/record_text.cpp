@@ -54,9 +54,8 @@ std::size_t FirstToEscape(std::string_view value) {
 
 // The record's five members in order; each value stands between its prefix
 // and the next prefix (or the closing text).
-constexpr std::string_view kMemberPrefix[5] = {"{\"user_id\":\"", "\",\"game_id\":\"",
-                                               "\",\"type\":\"", "\",\"time\":\"",
-                                               "\",\"extra\":\""};
+constexpr std::string_view kMemberPrefix[5] = {"{\"user_id\":\"", "\",\"game_id\":\"", "\",\"type\":\"",
+                                               "\",\"time\":\"", "\",\"extra\":\""};
 constexpr std::string_view kRecordEnd = "\"}";
 static_assert(kMemberPrefix[0].size() + kMemberPrefix[1].size() + kMemberPrefix[2].size() +
                   kMemberPrefix[3].size() + kMemberPrefix[4].size() + kRecordEnd.size() ==
@@ -72,8 +71,7 @@ char *Put(char *p, std::string_view text) {
 void AppendJsonEscaped(std::string &out, std::string_view value) {
   static constexpr char kHex[] = "0123456789abcdef";
   std::size_t run = 0; // start of the bytes not yet copied
-  for (std::size_t i = FirstToEscape(value); i < value.size();
-       i = run + FirstToEscape(value.substr(run))) {
+  for (std::size_t i = FirstToEscape(value); i < value.size(); i = run + FirstToEscape(value.substr(run))) {
     const unsigned char c = static_cast<unsigned char>(value[i]);
     out.append(value.data() + run, i - run);
     run = i + 1;

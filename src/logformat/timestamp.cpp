@@ -1,6 +1,5 @@
 #include "logformat/timestamp.h"
 
-
 namespace orvane {
 namespace {
 
@@ -8,7 +7,9 @@ struct CalendarTime {
   std::int64_t year, month, day, hour, minute, second; // month 1 to 12
 };
 
-std::int64_t FloorDiv(std::int64_t a, std::int64_t b) { return a / b - ((a % b != 0) && ((a < 0) != (b < 0))); }
+std::int64_t FloorDiv(std::int64_t a, std::int64_t b) {
+  return a / b - ((a % b != 0) && ((a < 0) != (b < 0)));
+}
 
 // Proleptic Gregorian calendar from a day count, valid for every int64 input
 // that matters; unlike gmtime it cannot fail, so the text is always a date.

@@ -14,7 +14,8 @@ static void ORVANE_CALL print_message(LogLevel level, const char *message) {
 static int run(void) {
   oRegisterForLogs(print_message);
   puts(oGetVersion()); /* ORVANE_EXPECTED_VERSION: the version of the package's metadata */
-  if (strcmp(oGetVersion(), ORVANE_SDK_VERSION_STRING) || strcmp(oGetVersion(), ORVANE_EXPECTED_VERSION)) return 1;
+  if (strcmp(oGetVersion(), ORVANE_SDK_VERSION_STRING) || strcmp(oGetVersion(), ORVANE_EXPECTED_VERSION))
+    return 1;
   return oAnalyticsGameEnter("consumer", "u1") != 0;
 }
 

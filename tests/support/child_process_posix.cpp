@@ -30,9 +30,11 @@ ChildResult RunChild(const std::string &program, const std::vector<std::string> 
   std::FILE *child = ::popen(command.c_str(), "r");
   if (child == nullptr) return result;
   char buffer[4096];
-  for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, child)) != 0;) result.output.append(buffer, n);
+  for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, child)) != 0;)
+    result.output.append(buffer, n);
   const int status = ::pclose(child);
-  if (WIFEXITED(status) && WEXITSTATUS(status) != 137 && WEXITSTATUS(status) != 124) result.exit_code = WEXITSTATUS(status);
+  if (WIFEXITED(status) && WEXITSTATUS(status) != 137 && WEXITSTATUS(status) != 124)
+    result.exit_code = WEXITSTATUS(status);
   return result;
 }
 

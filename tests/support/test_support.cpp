@@ -29,7 +29,8 @@ void ORVANE_CALL CaptureMessage(LogLevel level, const char *message) {
 std::string MakeTempDirectory() {
   static std::random_device entropy;
   for (;;) {
-    const auto candidate = std::filesystem::temp_directory_path() / ("orvane-test-" + std::to_string(entropy()));
+    const auto candidate =
+        std::filesystem::temp_directory_path() / ("orvane-test-" + std::to_string(entropy()));
     if (std::filesystem::create_directory(candidate)) return candidate.string();
   }
 }

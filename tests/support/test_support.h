@@ -68,8 +68,8 @@ protected:
 };
 
 struct ChildResult {
-  int exit_code = -1;  // -1 when it did not run or exit normally
-  std::string output;  // standard output and error, interleaved
+  int exit_code = -1; // -1 when it did not run or exit normally
+  std::string output; // standard output and error, interleaved
 };
 // Runs `program` with `args` (args[0] is the child's argument 0) and the
 // environment plus `env`; kills it after `timeout_seconds`.

@@ -17,7 +17,8 @@ TEST_F(WindowsTest, DirectoryExistsWithOrWithoutTrailingSeparator) {
   WriteFile(base_ + "\\file", "x");
   const std::pair<const char *, bool> cases[] = {{"\\dir", true},   {"\\dir\\", true},   {"/dir/", true},
                                                  {"\\file", false}, {"\\file\\", false}, {"\\none\\", false}};
-  for (const auto &[path, exists] : cases) EXPECT_EQ(os.directory_exists((base_ + path).c_str()), exists) << path;
+  for (const auto &[path, exists] : cases)
+    EXPECT_EQ(os.directory_exists((base_ + path).c_str()), exists) << path;
 }
 
 // A device or a directory is no log. Two handles of one log, as two games hold
@@ -59,7 +60,8 @@ TEST_F(WindowsTest, ThreadsRecordAtOnceInCrLfLines) {
     const std::vector<std::string> lines = Split(ReadFile(LogPath(game)).value_or(""), "\r\n");
     EXPECT_EQ(lines.size(), 201u) << "INIT and 200 ENTER records in log " << game;
     for (const std::string &line : lines)
-      EXPECT_NE(DecryptLine(line, key).value_or("").find("\"game_id\":\"" + game + '"'), std::string::npos) << line;
+      EXPECT_NE(DecryptLine(line, key).value_or("").find("\"game_id\":\"" + game + '"'), std::string::npos)
+          << line;
   }
 }
 

@@ -31,8 +31,8 @@ bool AddCandidate(KeyCandidates &candidates, std::string_view game_id) {
   return true;
 }
 
-LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::string_view line,
-                   LineBuffers &buffers, EventRecord &record) {
+LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::string_view line, LineBuffers &buffers,
+                   EventRecord &record) {
   if (const LineFault fault = TakeCiphertext(line, buffers); fault != LineFault::kNone) return fault;
   LineFault worst = LineFault::kBadPadding;
   const std::size_t count = candidates.game_ids.size();

@@ -36,7 +36,7 @@ bool AddCandidate(KeyCandidates &candidates, std::string_view game_id);
 // Since runs of lines share a key, the last winner is tried first and a
 // line costs one decryption except where a run begins. kBadPadding when no
 // key decrypts it, kNotRecord when one does but the text is no record.
-LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::string_view line,
-                   LineBuffers &buffers, EventRecord &record);
+LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::string_view line, LineBuffers &buffers,
+                   EventRecord &record);
 
 } // namespace orvane::logcat

@@ -22,8 +22,7 @@ std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folde
   for (std::filesystem::directory_iterator entry(folder, error), end; !error && entry != end;
        entry.increment(error)) {
     std::error_code type_error;
-    if (entry->is_regular_file(type_error) && GameIdOfLogName(entry->path()))
-      files.push_back(entry->path());
+    if (entry->is_regular_file(type_error) && GameIdOfLogName(entry->path())) files.push_back(entry->path());
   }
   std::sort(files.begin(), files.end());
   return files;

@@ -1,8 +1,8 @@
 // orvane-logcat: reads games' encrypted log files back into records, one JSON
 // object per line, checks them, and follows them as games append.
 #include "key_discovery.h"
-#include "logformat/log_lines.h"
 #include "log_sources.h"
+#include "logformat/log_lines.h"
 #include "options.h"
 #include "standard_input.h"
 #include "valid_utf8.h"
@@ -37,9 +37,9 @@ struct Source {
   fs::file_time_type folder_time{}; // of the folder when it was last listed
   KeyCandidates keys;
   std::FILE *file = nullptr;
-  bool done = false;             // nothing more will be read from it
-  bool said_waiting = false;     // the "does not exist yet" notice went out
-  bool unreadable = false;       // could not be opened or read
+  bool done = false;         // nothing more will be read from it
+  bool said_waiting = false; // the "does not exist yet" notice went out
+  bool unreadable = false;   // could not be opened or read
   LineSplitter lines;
   std::uint64_t offset = 0;      // bytes read so far
   std::size_t shown_partial = 0; // size of an unended line already taken, or 0
@@ -68,9 +68,7 @@ void Raise(Reader &reader, int status) {
   if (status > reader.status) reader.status = status;
 }
 
-void Complain(const std::string &text) {
-  std::fprintf(stderr, "orvane-logcat: %s\n", text.c_str());
-}
+void Complain(const std::string &text) { std::fprintf(stderr, "orvane-logcat: %s\n", text.c_str()); }
 
 // Adds the game ids of the source's folder to its candidates. True when the
 // folder changed since it was last listed and gave a new one: a process
@@ -132,8 +130,8 @@ void ScanFolder(Reader &reader, Folder &folder) {
 // Reads one line. True when a key read it, whether or not the filters pass
 // it. A line that no key reads is reported only when `report` is set: an
 // unended line may still be growing.
-bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_view line,
-              std::string &out, bool report) {
+bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_view line, std::string &out,
+              bool report) {
   if (line.empty()) return false;
   LineFault fault = ReadLine(reader.pool, source.keys, line, reader.buffers, reader.record);
   if ((fault == LineFault::kBadPadding || fault == LineFault::kNotRecord) && ListFolderKeys(source))
@@ -230,16 +228,15 @@ bool ReadAvailable(Reader &reader, Source &source) {
     if (n == 0) break;
     any = true;
     source.offset += n;
-    FeedBytes(source.lines, std::string_view(buffer, n),
-              [&](std::uint64_t number, std::string_view line) {
-                // Taken already while it was the last, unended line.
-                if (source.shown_partial != 0 && line.size() == source.shown_partial) {
-                  source.shown_partial = 0;
-                  return;
-                }
-                source.shown_partial = 0;
-                TakeLine(reader, source, number, line, out, true);
-              });
+    FeedBytes(source.lines, std::string_view(buffer, n), [&](std::uint64_t number, std::string_view line) {
+      // Taken already while it was the last, unended line.
+      if (source.shown_partial != 0 && line.size() == source.shown_partial) {
+        source.shown_partial = 0;
+        return;
+      }
+      source.shown_partial = 0;
+      TakeLine(reader, source, number, line, out, true);
+    });
     Emit(out);
   }
   if (std::ferror(source.file)) {
@@ -288,8 +285,10 @@ bool AddArguments(Reader &reader) {
   bool ok = true;
   for (const std::string &path : paths) {
     std::error_code error;
-    if (path != "-" && fs::is_directory(path, error)) AddFolder(reader, path);
-    else ok &= AddSource(reader, path);
+    if (path != "-" && fs::is_directory(path, error))
+      AddFolder(reader, path);
+    else
+      ok &= AddSource(reader, path);
   }
   return ok;
 }

@@ -19,10 +19,14 @@ std::size_t SequenceLength(std::string_view text, std::size_t i) {
   const auto lead = static_cast<unsigned char>(text[i]);
   unsigned low = 0x80, high = 0xbf;
   std::size_t length = 0;
-  if (lead >= 0xc2 && lead <= 0xdf) length = 2;
-  else if (lead >= 0xe0 && lead <= 0xef) length = 3;
-  else if (lead >= 0xf0 && lead <= 0xf4) length = 4;
-  else return 0;
+  if (lead >= 0xc2 && lead <= 0xdf)
+    length = 2;
+  else if (lead >= 0xe0 && lead <= 0xef)
+    length = 3;
+  else if (lead >= 0xf0 && lead <= 0xf4)
+    length = 4;
+  else
+    return 0;
   if (lead == 0xe0) low = 0xa0;
   if (lead == 0xed) high = 0x9f;
   if (lead == 0xf0) low = 0x90;

@@ -153,18 +153,18 @@ std::string HomeDirectory() {
   std::vector<char> buffer(size > 0 ? static_cast<std::size_t>(size) : 16384);
   struct passwd entry;
   struct passwd *found = nullptr;
-  if (::getpwuid_r(::getuid(), &entry, buffer.data(), buffer.size(), &found) == 0 && found &&
-      found->pw_dir && found->pw_dir[0] == '/')
+  if (::getpwuid_r(::getuid(), &entry, buffer.data(), buffer.size(), &found) == 0 && found && found->pw_dir &&
+      found->pw_dir[0] == '/')
     return found->pw_dir;
   return {};
 }
 
 const Calls kPosixCalls = {
-    DirectoryExistsPosix,    MakeDirectoryPosix,     MakePrivateDirectoriesPosix,
-    OpenLogPosix,            FileSizePosix,          AppendPosix,
-    TruncateFilePosix,       CloseFilePosix,         TryLockFilePosix,
-    UnlockFilePosix,         NowSecondsPosix,        SteadyMillisecondsPosix,
-    SleepMillisecondsPosix,  ArgumentListPosix,
+    DirectoryExistsPosix,   MakeDirectoryPosix, MakePrivateDirectoriesPosix,
+    OpenLogPosix,           FileSizePosix,      AppendPosix,
+    TruncateFilePosix,      CloseFilePosix,     TryLockFilePosix,
+    UnlockFilePosix,        NowSecondsPosix,    SteadyMillisecondsPosix,
+    SleepMillisecondsPosix, ArgumentListPosix,
 };
 
 Calls g_calls = kPosixCalls;

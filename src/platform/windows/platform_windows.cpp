@@ -55,10 +55,10 @@ FileHandle OpenLogWindows(const char *path, std::int64_t &size) {
   // meanwhile. A reparse point (a link) at the path is opened as itself, not
   // followed, and then refused below; the folders keep their default access
   // rules, since several users of one machine share C:\Orvane\.
-  const HANDLE file = ::CreateFileA(
-      path, FILE_READ_DATA | FILE_APPEND_DATA | FILE_READ_ATTRIBUTES | SYNCHRONIZE,
-      FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_ALWAYS,
-      FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
+  const HANDLE file =
+      ::CreateFileA(path, FILE_READ_DATA | FILE_APPEND_DATA | FILE_READ_ATTRIBUTES | SYNCHRONIZE,
+                    FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_ALWAYS,
+                    FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
   if (file == INVALID_HANDLE_VALUE) return kNoFile;
   BY_HANDLE_FILE_INFORMATION info;
   if (::GetFileType(file) != FILE_TYPE_DISK) {
@@ -71,8 +71,8 @@ FileHandle OpenLogWindows(const char *path, std::int64_t &size) {
     ::CloseHandle(file);
     return kNoFile;
   } else {
-    size = static_cast<std::int64_t>((static_cast<std::uint64_t>(info.nFileSizeHigh) << 32) |
-                                     info.nFileSizeLow);
+    size =
+        static_cast<std::int64_t>((static_cast<std::uint64_t>(info.nFileSizeHigh) << 32) | info.nFileSizeLow);
   }
   return reinterpret_cast<FileHandle>(file);
 }
@@ -88,15 +88,14 @@ bool AppendWindows(FileHandle file, const void *data, std::size_t size) {
   // would split the line.
   if (size > MAXDWORD) return false;
   DWORD written = 0;
-  return ::WriteFile(AsHandle(file), data, static_cast<DWORD>(size), &written, nullptr) &&
-         written == size;
+  return ::WriteFile(AsHandle(file), data, static_cast<DWORD>(size), &written, nullptr) && written == size;
 }
 
 bool TruncateFileWindows(FileHandle file, std::int64_t size) {
   // The log handle may only append; cutting back needs write access, which a
   // second handle to the same file gets without opening the path again.
-  const HANDLE writer = ::ReOpenFile(AsHandle(file), GENERIC_WRITE,
-                                     FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, 0);
+  const HANDLE writer =
+      ::ReOpenFile(AsHandle(file), GENERIC_WRITE, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, 0);
   if (writer == INVALID_HANDLE_VALUE) return false;
   LARGE_INTEGER at;
   at.QuadPart = size;
@@ -123,8 +122,7 @@ LockResult TryLockFileWindows(FileHandle file) {
   // A lock belongs to its handle, so two handles of one process exclude each
   // other as two processes do.
   OVERLAPPED where = LockRange();
-  if (::LockFileEx(AsHandle(file), LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0,
-                   &where))
+  if (::LockFileEx(AsHandle(file), LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0, &where))
     return LockResult::kLocked;
   return ::GetLastError() == ERROR_LOCK_VIOLATION ? LockResult::kBusy : LockResult::kFailed;
 }
@@ -150,26 +148,24 @@ struct ArgvRelease {
 bool ArgumentListWindows(ArgumentList &args) {
   args.clear();
   int count = 0;
-  const std::unique_ptr<LPWSTR, ArgvRelease> list(
-      ::CommandLineToArgvW(::GetCommandLineW(), &count));
+  const std::unique_ptr<LPWSTR, ArgvRelease> list(::CommandLineToArgvW(::GetCommandLineW(), &count));
   if (!list) return false;
   // The units are copied as they are: wchar_t is a UTF-16 unit here too.
   static_assert(sizeof(wchar_t) == sizeof(char16_t));
   args.reserve(count > 0 ? static_cast<std::size_t>(count) : 0);
   for (int i = 0; i < count; ++i) {
     std::u16string units;
-    for (const wchar_t *p = list.get()[i]; *p != L'\0'; ++p)
-      units.push_back(static_cast<char16_t>(*p));
+    for (const wchar_t *p = list.get()[i]; *p != L'\0'; ++p) units.push_back(static_cast<char16_t>(*p));
     args.push_back(std::move(units));
   }
   return true;
 }
 
 const Calls kWindowsCalls = {
-    DirectoryExistsWindows,   MakeDirectoryWindows,      MakePrivateDirectoriesWindows,
-    OpenLogWindows,           FileSizeWindows,           AppendWindows,
-    TruncateFileWindows,      CloseFileWindows,          TryLockFileWindows,
-    UnlockFileWindows,        NowSecondsWindows,         SteadyMillisecondsWindows,
+    DirectoryExistsWindows,   MakeDirectoryWindows, MakePrivateDirectoriesWindows,
+    OpenLogWindows,           FileSizeWindows,      AppendWindows,
+    TruncateFileWindows,      CloseFileWindows,     TryLockFileWindows,
+    UnlockFileWindows,        NowSecondsWindows,    SteadyMillisecondsWindows,
     SleepMillisecondsWindows, ArgumentListWindows,
 };
 
