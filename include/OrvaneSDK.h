@@ -135,10 +135,21 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  *                                                  result -1; also for a game
  *                                                  id that is not a plain file
  *                                                  name (see below)
- *   ERROR   "log file failed to write."            result -1 (disk full, I/O)
+ *   ERROR   "log file failed to write."            result -1 (disk full, I/O); a
+ *                                                  first line that did not go
+ *                                                  in whole is cut away
+ *   ERROR   "log file is locked by another process."
+ *                                                  result -1: the log was
+ *                                                  empty and another writer
+ *                                                  held it for over a second
  *   ERROR   "failed. Record encryption failed."    result -1
+ *   ERROR   "failed. Record too large."            result -1: the line would
+ *                                                  exceed 64 MiB; nothing
+ *                                                  written
+ *   ERROR   "failed. Internal error."              result -1 (out of memory)
  *
- * A game id must be usable as a file name on every platform: it is refused
+ * Only a regular file is a log: a link, FIFO or device at the log's path is
+ * refused as a bad game id. A game id must be usable as a file name on every platform: it is refused
  * when it is "." or "..", holds a byte below 0x20 or one of / \ : * ? " < > |,
  * ends in "." or " ", or its part before the first "." is a Windows device
  * name (CON, PRN, AUX, NUL, CONIN$, CONOUT$, COM0-COM9, LPT0-LPT9, also
