@@ -41,8 +41,10 @@ run d clang --target=x86_64-pc-windows-msvc -ffreestanding "${flags[@]}" -I"$win
   -c "$here/consumer.c" -o d/consumer.obj
 run d lld-link /nologo /entry:start /subsystem:console /nodefaultlib /out:d/consumer.exe d/consumer.obj \
   "$windows/lib/OrvaneSDK.lib" /usr/x86_64-w64-mingw32/lib/lib{kernel32,msvcrt}.a
+# The prefix is made and written out (wineserver -w) before a game runs in it.
+wineboot -i </dev/null >/dev/null 2>&1 && wineserver -w
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
-wineboot -i </dev/null >/dev/null 2>&1
+wineserver -p </dev/null >/dev/null 2>&1
 for game in c d; do
   cp "$windows/bin/OrvaneSDK.dll" $game/
   first_event $game "$WINEPREFIX/drive_c" bash "$here/../windows/wine_run.sh" "$WINEPREFIX" $game/consumer.exe
