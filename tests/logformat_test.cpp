@@ -46,7 +46,8 @@ TEST(LogFormat, RecordTextWithEscapes) {
       {std::string("\x01\x1f\x20/\x7f\xc3\xa9\xff", 8), "\\u0001\\u001f /\x7f\xc3\xa9\xff"},
       {"0123456\"", "0123456\\\""},
       {"01234567\"9", "01234567\\\"9"},
-      {"0123456789abcde\x1b", "0123456789abcde\\u001b"},
+      {"0123456789ABCDE\x1b", "0123456789ABCDE\\u001b"}, // a word of digits and capitals
+      {"ABCDEFG\x01", "ABCDEFG\\u0001"},
   };
   for (const auto &[value, escaped] : cases)
     EXPECT_EQ(Record("1234", value, "SPECIAL", value),

@@ -85,6 +85,14 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
 }
 
+// The steady clock of the lock's deadline moves with the pauses between tries.
+TEST(PosixClock, PausesMoveTheSteadyClock) {
+  const platform::Calls &os = platform::native_calls();
+  const std::int64_t before = os.steady_milliseconds();
+  os.sleep_milliseconds(30);
+  EXPECT_GE(os.steady_milliseconds() - before, 25);
+}
+
 // Where the files go on POSIX: XDG_DATA_HOME when absolute, else an absolute
 // $HOME/.local/share, else the account's home directory. (Each test runs in
 // a process of its own, so the environment is not put back.)
