@@ -85,6 +85,21 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
 }
 
+// The lock belongs to the open file: a second open of the same log, as
+// another thread or process has, finds it busy until it is given back.
+TEST_F(PosixTest, LockIsHeldPerOpenFile) {
+  std::filesystem::create_directories(where_.logs);
+  const platform::Calls &os = platform::native_calls();
+  std::int64_t size = -1;
+  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), size);
+  const platform::FileHandle second = os.open_log(LogPath("g1").c_str(), size);
+  EXPECT_EQ(os.try_lock_file(first), platform::LockResult::kLocked);
+  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kBusy);
+  os.unlock_file(first);
+  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kLocked);
+  EXPECT_TRUE(os.close_file(first) && os.close_file(second));
+}
+
 // The steady clock of the lock's deadline moves with the pauses between tries.
 TEST(PosixClock, PausesMoveTheSteadyClock) {
   const platform::Calls &os = platform::native_calls();
