@@ -59,7 +59,6 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   const std::string_view type = kTypes[data[0] % 4];
   std::string_view rest(reinterpret_cast<const char *>(data) + 1, size - 1);
   const std::string_view game_id = TakeValue(rest), user_id = TakeValue(rest), extra = TakeValue(rest);
-
   // "<id>.log" stays one name inside the folder only without a separator; a
   // colon names a drive or a stream on Windows, a control byte no file.
   if (orvane::IsUsableGameId(game_id))
@@ -78,7 +77,6 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     Fail("no hex line");
   if (!DecryptIndependently(ciphertext, key_game_id, plain) || plain != record)
     Fail("decrypts to another text");
-
   const std::optional<orvane::EventRecord> parsed = orvane::ParseEventRecord(plain);
   if (parsed != orvane::EventRecord{std::string(user_id), std::string(game_id), std::string(type), time,
                                     std::string(extra)})
