@@ -154,16 +154,18 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   std::remove((logs_ + "gZ.log").c_str());
   const std::string bad = "orvane-logcat: " + logs_ + "gA.log:5: " + std::string(FaultText(F::kBadPadding));
   EXPECT_EQ(Run({logs_}), Output(1, Printed("gA", {"gA", "gB", ""}) + b, bad + "\n"));
-  // Followed: the logs, then each new line once, the newest before it ends; one keyed by a new log's game.
+  // Followed: the logs, then each new line once, the newest before it ends; one keyed by a new log's game;
+  // a missing log is waited for.
   Output followed;
-  std::thread follower([&] { followed = Run({"--follow", "--type", "SPECIAL", logs_}, "", 4); });
+  std::thread tail([&] { followed = Run({"--follow", "--type=SPECIAL", logs_, logs_ + "gW.log"}, "", 4); });
   Host({"enter", "gF", "u6", "special", "gB", "u6", "s"}, 0, 500);
   Host({"special", "gA", "u7", "t"}, 0, 500);
   Host({"exit", "gA", "u7"}, 0, 500);
-  follower.join();
+  tail.join();
   const std::string s = Split(Printed("gB", {"gA", "gB", "gF"}), "\n")[4] + "\n",
                     t = Split(Printed("gA", {"gA", "gB", ""}), "\n")[4] + "\n";
-  EXPECT_EQ(followed, Output(-1, lb[3] + "\n" + s + t, bad + "\n"));
+  const std::string waiting = "orvane-logcat: " + logs_ + "gW.log: does not exist yet; waiting for it\n";
+  EXPECT_EQ(followed, Output(-1, lb[3] + "\n" + s + t, waiting + bad + "\n"));
 }
 
 TEST_F(LogcatTool, UsageErrorsHelpAndVersion) {
