@@ -4,10 +4,12 @@
 #include "support/test_support.h"
 
 #include <atomic>
+#include <csignal>
 #include <filesystem>
 #include <pthread.h>
 #include <pwd.h>
 #include <string>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -83,6 +85,26 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   EXPECT_EQ(outcome, PTHREAD_CANCELED);
   EXPECT_EQ(g_stage, 3);
   EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
+}
+
+// A full disk: the kernel takes part of a write, and the platform says so.
+TEST_F(PosixTest, AShortWriteIsAFailure) {
+  std::filesystem::create_directories(where_.logs);
+  const platform::Calls &os = platform::native_calls();
+  std::int64_t size = -1;
+  const platform::FileHandle file = os.open_log(LogPath("g1").c_str(), size);
+  rlimit saved, full;
+  ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
+  full = saved;
+  full.rlim_cur = 4;
+  const auto previous = std::signal(SIGXFSZ, SIG_IGN);
+  ::setrlimit(RLIMIT_FSIZE, &full);
+  const bool written = os.append(file, "0123456789", 10);
+  ::setrlimit(RLIMIT_FSIZE, &saved);
+  std::signal(SIGXFSZ, previous);
+  EXPECT_FALSE(written);
+  EXPECT_EQ(os.file_size(file), 4);
+  os.close_file(file);
 }
 
 // The lock belongs to the open file: a second open of the same log, as
