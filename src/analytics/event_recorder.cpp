@@ -3,6 +3,7 @@
 #include "analytics/game_id.h"
 #include "analytics/record_cipher.h"
 #include "core/storage.h"
+#include "logformat/hex.h"
 #include "logformat/record_text.h"
 #include "logformat/timestamp.h"
 #include "platform/platform.h"
@@ -136,15 +137,13 @@ struct Event {
 // The game id as a message may show it: control bytes would let a hostile id
 // forge lines in the host's own log, so they appear as \xNN.
 void AppendPrintable(std::string &out, std::string_view text) {
-  static constexpr char kHex[] = "0123456789abcdef";
   for (const char c : text) {
-    const auto byte = static_cast<unsigned char>(c);
+    const auto byte = static_cast<std::uint8_t>(c);
     if (byte >= 0x20 && byte != 0x7f) {
       out += c;
     } else {
       out += "\\x";
-      out += kHex[byte >> 4];
-      out += kHex[byte & 0x0f];
+      AppendHex(out, &byte, 1);
     }
   }
 }
@@ -256,8 +255,9 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   // without a line break in front; a first event writes the INIT line and its
   // own in one write, so that no log ever starts with anything else.
   const bool starts_log = log.size == 0;
+  const bool init_first = starts_log && !is_init;
   std::string_view bytes = space.line;
-  if (starts_log && !is_init) {
+  if (init_first) {
     messages.Add(LogLevel::Warning, type.log_not_initialized);
     space.init_line.clear();
     if (const Encoded encoded = EncodeLine(space, event, kInitEvent, time, space.init_line);
@@ -276,11 +276,11 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   if (!written && starts_log) os.truncate_file(log.handle, 0);
   written = log.Close() && written;
   if (!written) {
-    if (starts_log && !is_init) messages.Add(LogLevel::Error, kInitEvent.write_failed);
+    if (init_first) messages.Add(LogLevel::Error, kInitEvent.write_failed);
     messages.Add(LogLevel::Error, type.write_failed);
     return -1;
   }
-  if (starts_log && !is_init) messages.Add(LogLevel::Info, kInitEvent.ok);
+  if (init_first) messages.Add(LogLevel::Info, kInitEvent.ok);
   messages.Add(LogLevel::Info, type.ok);
   return 0;
 }

@@ -1,5 +1,7 @@
 #include "logformat/record_text.h"
 
+#include "logformat/hex.h"
+
 #include <cstdint>
 #include <cstring>
 
@@ -69,10 +71,9 @@ char *Put(char *p, std::string_view text) {
 } // namespace
 
 void AppendJsonEscaped(std::string &out, std::string_view value) {
-  static constexpr char kHex[] = "0123456789abcdef";
   std::size_t run = 0; // start of the bytes not yet copied
   for (std::size_t i = FirstToEscape(value); i < value.size(); i = run + FirstToEscape(value.substr(run))) {
-    const unsigned char c = static_cast<unsigned char>(value[i]);
+    const auto c = static_cast<std::uint8_t>(value[i]);
     out.append(value.data() + run, i - run);
     run = i + 1;
     switch (c) {
@@ -83,10 +84,7 @@ void AppendJsonEscaped(std::string &out, std::string_view value) {
     case '\n': out += "\\n"; break;
     case '\r': out += "\\r"; break;
     case '\t': out += "\\t"; break;
-    default:
-      out += "\\u00";
-      out += kHex[c >> 4];
-      out += kHex[c & 0x0f];
+    default: out += "\\u00"; AppendHex(out, &c, 1);
     }
   }
   out.append(value.data() + run, value.size() - run);
