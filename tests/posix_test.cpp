@@ -1,5 +1,5 @@
 // What only POSIX systems have: file modes, links, FIFOs, thread
-// cancellation, and where the files go.
+// cancellation, short writes, file locks, and where the files go.
 #include "OrvaneSDK.h"
 #include "support/test_support.h"
 
@@ -8,7 +8,6 @@
 #include <filesystem>
 #include <pthread.h>
 #include <pwd.h>
-#include <string>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -16,43 +15,35 @@
 namespace orvane::testing {
 namespace {
 
-class PosixTest : public SandboxTest {};
+using PosixTest = SandboxTest;
+const platform::Calls &os = platform::native_calls();
 
 mode_t ModeOf(const std::string &path) {
   struct stat st;
   return ::stat(path.c_str(), &st) == 0 ? st.st_mode & 07777 : 0;
 }
 
-// Owner-only whatever the umask: no other user may plant links or FIFOs
-// where the logs go, or read logs whose key follows from their names.
-TEST_F(PosixTest, StorageAndLogsAreOwnerOnly) {
+// Owner-only whatever the umask: no other user may plant links or FIFOs where
+// the logs go, or read logs whose key follows from their names. Anything but
+// a regular file at a log path is refused at once: a FIFO would hang the
+// game, a link would let it write anywhere the game may.
+TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
   const mode_t saved = ::umask(0);
-  const int result = oAnalyticsGameEnter("g1", "u1");
+  ASSERT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
   ::umask(saved);
-  ASSERT_EQ(result, 0);
-  for (const std::string &dir : {where_.base, where_.root, where_.logs}) EXPECT_EQ(ModeOf(dir), 0700u) << dir;
+  for (const std::string &dir : {base_ + "/home", where_.base, where_.root, where_.logs}) EXPECT_EQ(ModeOf(dir), 0700u) << dir;
   EXPECT_EQ(ModeOf(LogPath("g1")), 0600u);
-}
-
-// Anything but a regular file at a log path is refused at once: a FIFO would
-// hang the game, a link would let it write anywhere the game may.
-TEST_F(PosixTest, OnlyARegularFileIsALog) {
-  std::filesystem::create_directories(where_.logs);
-  const std::string outside = base_ + "/outside";
-  WriteFile(outside, "kept");
+  WriteFile(base_ + "/outside", "kept");
   ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600), 0);
-  std::filesystem::create_symlink(outside, LogPath("link"));
+  std::filesystem::create_symlink(base_ + "/outside", LogPath("link"));
   std::filesystem::create_symlink(base_ + "/planted", LogPath("dangling"));
-  for (const char *game : {"fifo", "link", "dangling"}) {
-    SCOPED_TRACE(game);
+  for (const std::string game : {"fifo", "link", "dangling"}) {
     Captured().clear();
-    EXPECT_EQ(oAnalyticsGameEnter(game, "u1"), -1);
-    EXPECT_EQ(Captured(),
-              (std::vector<Message>{{2, std::string("[OrvaneSDK] Analytics ENTER - log file failed "
-                                                    "to open. Maybe a bad game_id (") +
-                                            game + ")?"}}));
+    EXPECT_EQ(oAnalyticsGameEnter(game.c_str(), "u1"), -1);
+    EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - log file failed to open. "
+                                                    "Maybe a bad game_id (" + game + ")?"}}));
   }
-  EXPECT_EQ(ReadFile(outside), "kept");
+  EXPECT_EQ(ReadFile(base_ + "/outside"), "kept");
   EXPECT_FALSE(std::filesystem::exists(base_ + "/planted"));
 }
 
@@ -65,14 +56,13 @@ void ORVANE_CALL WaitInsideCallback(LogLevel, const char *message) {
   while (g_stage != 2) ::usleep(1000); // a cancellation point
 }
 void *RecordOnce(void *) {
-  const int result = oAnalyticsInit("g1", "u1");
-  g_stage = 3 + result;
+  g_stage = 3 + oAnalyticsInit("g1", "u1");
   pthread_testcancel();
   return nullptr;
 }
 
 TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
-  std::filesystem::create_directories(where_.logs);
+  std::filesystem::create_directories(where_.logs); // one message from the library: "INIT - OK"
   oRegisterForLogs(WaitInsideCallback);
   pthread_t thread;
   ASSERT_EQ(pthread_create(&thread, nullptr, RecordOnce, nullptr), 0);
@@ -81,50 +71,34 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   g_stage = 2;
   void *outcome = nullptr;
   pthread_join(thread, &outcome);
-  oRegisterForLogs(nullptr);
   EXPECT_EQ(outcome, PTHREAD_CANCELED);
   EXPECT_EQ(g_stage, 3);
   EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
 }
 
-// A full disk: the kernel takes part of a write, and the platform says so.
-TEST_F(PosixTest, AShortWriteIsAFailure) {
+// The platform layer on real files: a full disk takes part of a write, and
+// the platform says so; the lock belongs to the open file, so a second open of
+// the same log, as another thread or process has, finds it busy until it is
+// given back; the steady clock of the lock's deadline moves with the pauses.
+TEST_F(PosixTest, PlatformCallsOnRealFiles) {
   std::filesystem::create_directories(where_.logs);
-  const platform::Calls &os = platform::native_calls();
   std::int64_t size = -1;
-  const platform::FileHandle file = os.open_log(LogPath("g1").c_str(), size);
+  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), size),
+                             second = os.open_log(LogPath("g1").c_str(), size);
   rlimit saved, full;
   ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
-  full = saved;
-  full.rlim_cur = 4;
+  full = saved, full.rlim_cur = 4;
   const auto previous = std::signal(SIGXFSZ, SIG_IGN);
   ::setrlimit(RLIMIT_FSIZE, &full);
-  const bool written = os.append(file, "0123456789", 10);
+  EXPECT_FALSE(os.append(first, "0123456789", 10));
   ::setrlimit(RLIMIT_FSIZE, &saved);
   std::signal(SIGXFSZ, previous);
-  EXPECT_FALSE(written);
-  EXPECT_EQ(os.file_size(file), 4);
-  os.close_file(file);
-}
-
-// The lock belongs to the open file: a second open of the same log, as
-// another thread or process has, finds it busy until it is given back.
-TEST_F(PosixTest, LockIsHeldPerOpenFile) {
-  std::filesystem::create_directories(where_.logs);
-  const platform::Calls &os = platform::native_calls();
-  std::int64_t size = -1;
-  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), size);
-  const platform::FileHandle second = os.open_log(LogPath("g1").c_str(), size);
+  EXPECT_EQ(os.file_size(first), 4);
   EXPECT_EQ(os.try_lock_file(first), platform::LockResult::kLocked);
   EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kBusy);
   os.unlock_file(first);
   EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kLocked);
   EXPECT_TRUE(os.close_file(first) && os.close_file(second));
-}
-
-// The steady clock of the lock's deadline moves with the pauses between tries.
-TEST(PosixClock, PausesMoveTheSteadyClock) {
-  const platform::Calls &os = platform::native_calls();
   const std::int64_t before = os.steady_milliseconds();
   os.sleep_milliseconds(30);
   EXPECT_GE(os.steady_milliseconds() - before, 25);

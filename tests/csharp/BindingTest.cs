@@ -4,9 +4,7 @@ using System;
 using System.Collections.Generic;
 using System.Diagnostics;
 using System.IO;
-using System.Linq;
 using System.Text.RegularExpressions;
-using System.Threading;
 using Orvane;
 
 static class BindingTest {
@@ -18,8 +16,7 @@ static class BindingTest {
 
     static int Main(string[] args) {
         Environment.SetEnvironmentVariable("XDG_DATA_HOME", Directory.CreateDirectory(data).FullName); // read at load
-        var cases = new Dictionary<string, Action> {{"example", () => Example(args[1])},
-            {"free-loop", () => FreeLoop(args[1])}, {"threads", Threads}, {"reload", Reload}};
+        var cases = new Dictionary<string, Action> {{"example", () => Example(args[1])}, {"reload", Reload}};
         try { cases[args[0]](); return 0; }
         catch (Exception e) { Console.WriteLine("FAILED: " + e.Message); return 1; }
         finally { Directory.Delete(data, true); }
@@ -49,34 +46,6 @@ static class BindingTest {
             "\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" + text.Replace("\"", "\\\"") + "\"}\n";
         Equal(line("INIT", "") + line("ENTER", "") + line("SPECIAL", extra) + line("EXIT", "") + 0,
               records + reader.ExitCode, "the log read back by orvane-logcat, and its exit status");
-    }
-
-    // Get-and-free, found and empty, until the heap has settled; then 50,000 more must not grow the
-    // process (a block kept per call would add megabytes; freeing the constant empty text would crash).
-    static void FreeLoop(string argument) {
-        long growth = 0, page = Environment.SystemPageSize; // resident after 50,000 calls, then 50,000 more add
-        for (int i = 1; i <= 100000; ++i) {
-            Equal(argument + "|", "--userUuid--" + OrvaneSDK.GetUserUuid() + "|" + OrvaneSDK.GetGameId(), "results");
-            if (i % 50000 != 0) continue;
-            GC.Collect();
-            growth = long.Parse(File.ReadAllText("/proc/self/statm").Split(' ')[1]) * page - growth;
-        }
-        Equal(true, growth < 4 << 20, "resident memory growth below 4 MiB over 50,000 calls (" + growth + " bytes)");
-    }
-
-    // Four threads report together; each message reaches the handler on the thread that caused it.
-    [ThreadStatic] static int heardHere;
-    static void Threads() {
-        var heard = new int[4];
-        OrvaneSDK.RegisterForLogs((level, message) => { if (level == LogLevel.Error) ++heardHere; });
-        var threads = Enumerable.Range(0, 4).Select(t => new Thread(() => {
-            for (int i = 0; i < 1000; ++i) OrvaneSDK.GetGameId(); // "Return GameID - Empty", an error
-            heard[t] = heardHere;
-        })).ToList();
-        threads.ForEach(thread => thread.Start());
-        threads.ForEach(thread => thread.Join());
-        OrvaneSDK.RegisterForLogs(null);
-        Equal("0 1000 1000 1000 1000", heardHere + " " + string.Join(" ", heard), "heard on main, then each thread");
     }
 
     // A script domain registers and is unloaded, as Unity's Editor reloads scripts: the binding withdraws

@@ -1,9 +1,6 @@
 #include "support/test_support.h"
 
 #include "core/storage.h"
-#include "logformat/hex.h"
-
-#include <openssl/evp.h>
 
 #include <filesystem>
 #include <fstream>
@@ -62,30 +59,6 @@ std::vector<std::string> Split(std::string_view text, std::string_view separator
   }
 }
 
-std::string KeyTextFor(std::string_view game_id) {
-  std::string key = "OrvaneLogKey-01";
-  key += game_id.substr(0, 65);
-  key.resize(80, '\0');
-  return key;
-}
-
-std::optional<std::string> DecryptLine(std::string_view hex, std::string_view key_text) {
-  std::vector<std::uint8_t> bytes;
-  if (key_text.size() != 80 || !DecodeHex(hex, bytes)) return std::nullopt;
-  const auto *key = reinterpret_cast<const unsigned char *>(key_text.data());
-  std::string plain(bytes.size() + 16, '\0');
-  auto *out = reinterpret_cast<unsigned char *>(plain.data());
-  int first = 0, second = 0;
-  EVP_CIPHER_CTX *ctx = EVP_CIPHER_CTX_new();
-  const bool ok = EVP_DecryptInit_ex(ctx, EVP_aes_256_cbc(), nullptr, key, key + 64) == 1 &&
-                  EVP_DecryptUpdate(ctx, out, &first, bytes.data(), static_cast<int>(bytes.size())) == 1 &&
-                  EVP_DecryptFinal_ex(ctx, out + first, &second) == 1;
-  EVP_CIPHER_CTX_free(ctx);
-  if (!ok) return std::nullopt;
-  plain.resize(static_cast<std::size_t>(first + second));
-  return plain;
-}
-
 std::vector<std::string> Records(const std::string &log, const std::string &key_text) {
   static const std::regex time(R"("time":"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d")");
   std::vector<std::string> records;
@@ -100,7 +73,8 @@ std::vector<std::string> Records(const std::string &log, const std::string &key_
 
 void SandboxTest::SetUp() {
   base_ = MakeTempDirectory();
-  where_ = {base_ + "/share", base_ + "/share/Orvane/", base_ + "/share/Orvane/Logs/"};
+  const std::string data = base_ + "/home/share"; // two levels to make, as for a home without ~/.local
+  where_ = {data, data + "/Orvane/", data + "/Orvane/Logs/"};
   SetStorageForTesting(where_);
   oRegisterForLogs(CaptureMessage);
   Captured().clear();

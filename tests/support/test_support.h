@@ -1,11 +1,12 @@
 // What the tests share: a private data directory per test, the host's
-// messages, files, a guard for swapped calls, the one independent decryption
-// of log lines, and a child process.
+// messages, files, a guard for swapped calls, the log's records through the
+// independent decryption, and a child process.
 #pragma once
 
 #include "OrvaneSDK.h"
 #include "cipher/cipher.h"
 #include "platform/platform.h"
+#include "support/decrypt_line.h"
 
 #include <gtest/gtest.h>
 
@@ -34,12 +35,6 @@ void WriteFile(const std::string &path, std::string_view bytes);
 // "a\nb" gives {a, b}; "" gives {""}.
 std::vector<std::string> Split(std::string_view text, std::string_view separator);
 
-// The key text of `game_id` built here, not by the library: the fixed text,
-// the first 65 bytes of the id, zeros to 80 bytes.
-std::string KeyTextFor(std::string_view game_id);
-// One hex line decrypted by OpenSSL's EVP calls directly (answered by CNG on
-// Windows), not by the library's cipher code; nullopt when it does not.
-std::optional<std::string> DecryptLine(std::string_view hex, std::string_view key_text);
 // The lines of a log (platform line breaks), each decrypted with its time
 // stamp replaced by "T", or "(undecryptable)"; none for a missing or empty log.
 std::vector<std::string> Records(const std::string &log, const std::string &key_text);
@@ -63,7 +58,7 @@ protected:
   std::string LogPath(std::string_view game_id) const { return where_.logs + std::string(game_id) + ".log"; }
 
   CallsGuard guard_;
-  std::string base_; // stands where the drive root or ~/.local/share would
+  std::string base_; // a fresh folder; the data directory is made two levels below it
   platform::StorageLocation where_;
 };
 

@@ -1,8 +1,5 @@
-// Windows rules that no Linux test can see: the platform layer, CNG on threads.
-#include "analytics/record_cipher.h"
+// Windows rules that no Linux test can see: the platform layer.
 #include "support/test_support.h"
-
-#include <thread>
 
 namespace orvane::testing {
 namespace {
@@ -40,29 +37,6 @@ TEST_F(WindowsTest, LogHandles) {
   EXPECT_TRUE(os.truncate_file(one, 3));
   EXPECT_EQ(ReadFile(path), "abc");
   EXPECT_TRUE(os.close_file(one) && os.close_file(two));
-}
-
-// Threads record at once, each with its own CNG session: every line decrypts
-// to a record of its log's game, CR LF between lines, none at the end. Each
-// keeps to its own log: wine makes an append a seek and a write, so two handles
-// of one file can overwrite each other's lines there, which Windows does not.
-TEST_F(WindowsTest, ThreadsRecordAtOnceInCrLfLines) {
-  oRegisterForLogs(nullptr); // the capturing callback is not thread-safe
-  std::vector<std::thread> threads;
-  for (int t = 0; t < 4; ++t)
-    threads.emplace_back([t] {
-      for (int i = 0; i < 200; ++i) EXPECT_EQ(oAnalyticsGameEnter(std::to_string(t).c_str(), "u1"), 0);
-    });
-  for (std::thread &thread : threads) thread.join();
-  // One key text serves the process: the first event's, whichever thread won.
-  const std::string key(GetKeyBlock().keyText.begin(), GetKeyBlock().keyText.end());
-  for (const std::string game : {"0", "1", "2", "3"}) {
-    const std::vector<std::string> lines = Split(ReadFile(LogPath(game)).value_or(""), "\r\n");
-    EXPECT_EQ(lines.size(), 201u) << "INIT and 200 ENTER records in log " << game;
-    for (const std::string &line : lines)
-      EXPECT_NE(DecryptLine(line, key).value_or("").find("\"game_id\":\"" + game + '"'), std::string::npos)
-          << line;
-  }
 }
 
 } // namespace
