@@ -14,9 +14,9 @@
 
 namespace orvane {
 
-#define ORVANE_EVENT_TYPE(TYPE, EXTRA)                                                                       \
+#define ORVANE_EVENT_TYPE(TYPE)                                                                              \
   {                                                                                                          \
-    TYPE, EXTRA, "[OrvaneSDK] Analytics " TYPE " - OK",                                                      \
+    TYPE, "[OrvaneSDK] Analytics " TYPE " - OK",                                                             \
         "[OrvaneSDK] Analytics " TYPE " - failed. Game id is empty",                                         \
         "[OrvaneSDK] Analytics " TYPE " - failed. User id is empty",                                         \
         "[OrvaneSDK] Analytics " TYPE " - SDK was never initialized. Initializing the SDK.",                 \
@@ -30,10 +30,10 @@ namespace orvane {
         "[OrvaneSDK] Analytics " TYPE " - failed. Internal error."                                           \
   }
 
-const EventType kInitEvent = ORVANE_EVENT_TYPE("INIT", false);
-const EventType kEnterEvent = ORVANE_EVENT_TYPE("ENTER", false);
-const EventType kExitEvent = ORVANE_EVENT_TYPE("EXIT", false);
-const EventType kSpecialEvent = ORVANE_EVENT_TYPE("SPECIAL", true);
+const EventType kInitEvent = ORVANE_EVENT_TYPE("INIT");
+const EventType kEnterEvent = ORVANE_EVENT_TYPE("ENTER");
+const EventType kExitEvent = ORVANE_EVENT_TYPE("EXIT");
+const EventType kSpecialEvent = ORVANE_EVENT_TYPE("SPECIAL");
 
 #undef ORVANE_EVENT_TYPE
 
@@ -196,7 +196,9 @@ enum class Encoded { kLine, kTooLarge, kCipherFailed };
 // Appends the encrypted line of one record of `type` to `out`.
 Encoded EncodeLine(Workspace &space, const Event &event, const EventType &type, std::string_view time,
                    std::string &out) {
-  const std::string_view extra = type.carries_extra ? event.extra : std::string_view();
+  // The event's own line stores what its export passed; the INIT line that
+  // a first event writes in front of it stores none.
+  const std::string_view extra = &type == &event.type ? event.extra : std::string_view();
   // The record is at least its unescaped values and the fixed text; a record
   // too large even so is refused before it is composed.
   const std::size_t least = kRecordFixedBytes + event.user_id.size() + event.game_id.size() +

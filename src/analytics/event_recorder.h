@@ -12,7 +12,6 @@ namespace orvane {
 // compile time so that the event path assembles no message text.
 struct EventType {
   const char *name;
-  bool carries_extra; // only SPECIAL stores the host's extra text
   const char *ok;
   const char *game_id_empty;
   const char *user_id_empty;

@@ -1,5 +1,5 @@
-// The C# binding under mono against the built libOrvaneSDK.so, one case per run (the command lines
-// are in CMakeLists.txt), each under a temporary XDG_DATA_HOME of its own.
+// The C# binding under mono against the built libOrvaneSDK.so, under a temporary XDG_DATA_HOME:
+//   mono orvane-binding-test.exe ORVANE-LOGCAT --userUuid--a1b2c3d4 --gameId--demo42
 using System;
 using System.Collections.Generic;
 using System.Diagnostics;
@@ -16,8 +16,7 @@ static class BindingTest {
 
     static int Main(string[] args) {
         Environment.SetEnvironmentVariable("XDG_DATA_HOME", Directory.CreateDirectory(data).FullName); // read at load
-        var cases = new Dictionary<string, Action> {{"example", () => Example(args[1])}, {"reload", Reload}};
-        try { cases[args[0]](); return 0; }
+        try { Reload(); Example(args[0]); return 0; }
         catch (Exception e) { Console.WriteLine("FAILED: " + e.Message); return 1; }
         finally { Directory.Delete(data, true); }
     }
@@ -48,14 +47,15 @@ static class BindingTest {
               records + reader.ExitCode, "the log read back by orvane-logcat, and its exit status");
     }
 
-    // A script domain registers and is unloaded, as Unity's Editor reloads scripts: the binding withdraws
-    // the handler first, so an event from the main domain neither calls into the unloaded code nor reaches it.
+    // First, a script domain registers and is unloaded, as Unity's Editor reloads scripts: the binding
+    // withdraws the handler first, so a message from the main domain neither calls into the unloaded
+    // code nor reaches it.
     static void Reload() {
         AppDomain scripts = AppDomain.CreateDomain("scripts");
         scripts.DoCallBack(() => OrvaneSDK.RegisterForLogs((level, message) => // where `data` is another path
             File.AppendAllText(Environment.GetEnvironmentVariable("XDG_DATA_HOME") + "/heard", message + "\n")));
         AppDomain.Unload(scripts);
-        Equal(0, OrvaneSDK.AnalyticsGameEnter("g1", "u1"), "an event after the unload");
+        Equal(-1, OrvaneSDK.AnalyticsGameEnter("", "u1"), "a call with a message after the unload");
         Equal("[OrvaneSDK] Logging initiated.\n", File.ReadAllText(data + "/heard"), "what the handler heard");
     }
 }
