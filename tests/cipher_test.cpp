@@ -67,12 +67,21 @@ TEST(Cipher, EveryLengthDecryptsWhole) {
     EXPECT_EQ(hex.size(), 2 * (length / 16 + 1) * 16) << length;
     EXPECT_EQ(DecryptLine(hex, key), record) << length;
   }
-  const CallsGuard restore;
-  cipher::backend().encrypt = [](cipher::Session *, const std::uint8_t *, std::size_t,
-                                 std::uint8_t *) -> std::ptrdiff_t { return -1; };
+  // A failure writes nothing; a session that could not be made is made again for the next record.
+  RecordCipher fresh;
   std::string hex = "kept";
-  EXPECT_FALSE(EncryptRecordText(state, "{}", hex));
+  {
+    const CallsGuard restore;
+    cipher::backend().encrypt = [](cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) {
+      return std::ptrdiff_t{-1};
+    };
+    EXPECT_FALSE(EncryptRecordText(state, "{}", hex));
+    cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * { return nullptr; };
+    EXPECT_FALSE(EncryptRecordText(fresh, "{}", hex));
+  }
   EXPECT_EQ(hex, "kept");
+  EXPECT_TRUE(EncryptRecordText(fresh, "{}", hex));
+  EXPECT_EQ(DecryptLine(hex.substr(4), key), "{}");
 }
 
 } // namespace

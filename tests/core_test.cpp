@@ -1,12 +1,9 @@
-// Core services: the host log channel (who hears which message, after which
-// registration) and the storage directories.
+// The host log channel: who hears which message, after which registration.
 #include "OrvaneSDK.h"
 #include "core/log_channel.h"
-#include "core/storage.h"
 #include "support/test_support.h"
 
 #include <atomic>
-#include <filesystem>
 #include <thread>
 
 namespace orvane::testing {
@@ -67,35 +64,6 @@ TEST(LogChannel, CallbackMayWithdrawItself) {
   oRegisterForLogs(WithdrawSelf);
   LogToHost(LogLevel::Info, "[OrvaneSDK] note");
   EXPECT_EQ(g_withdrawn, 1);
-}
-
-// oInitialize creates what is missing, the root before the logs, and says
-// what the disk shows afterwards.
-std::vector<std::string> g_created;
-bool RecordingMakeDirectory(const char *path) {
-  g_created.push_back(path);
-  return platform::native_calls().make_directory(path);
-}
-
-TEST_F(SandboxTest, InitializeCreatesWhatIsMissingRootFirst) {
-  platform::calls().make_directory = RecordingMakeDirectory;
-  const Message ok{0, "[OrvaneSDK] Initialize() - OK."}, failed{2, "[OrvaneSDK] Initialize() - failed."};
-  const std::string root = where_.root, logs = where_.logs;
-  const struct {
-    std::vector<std::string> before, created;
-    Message message;
-  } cases[] = {
-      {{}, {root, logs}, ok}, {{root}, {logs}, ok}, {{logs}, {}, ok}, {{root, "file"}, {logs}, failed}};
-  for (const auto &c : cases) {
-    RemoveTree(where_.base);
-    for (const std::string &dir : c.before)
-      dir == "file" ? WriteFile(root + "Logs", "in the way") : (void)std::filesystem::create_directories(dir);
-    g_created.clear();
-    Captured().clear();
-    oInitialize();
-    EXPECT_EQ(g_created, c.created);
-    EXPECT_EQ(Captured(), std::vector<Message>{c.message});
-  }
 }
 
 } // namespace

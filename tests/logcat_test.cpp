@@ -4,7 +4,6 @@
 #include "help_text.h"
 #include "key_discovery.h"
 #include "logformat/hex.h"
-#include "record_filter.h"
 #include "support/test_support.h"
 #include "valid_utf8.h"
 
@@ -77,19 +76,6 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   CloseKeyPool(pool);
 }
 
-TEST(RecordFilter, TimeWindowAndTypes) {
-  EXPECT_TRUE(IsTimeBound("2024-05-17") && IsTimeBound("2024-05-17T08:30:00") && IsEventType("ENTER"));
-  for (const char *bad : {"2024-05-1x", "2024-05-17 08:30:00", "2024-05-17T"}) EXPECT_FALSE(IsTimeBound(bad));
-  // clang-format off
-  const std::pair<RecordFilter, bool> cases[] = { // for a SPECIAL record of 2024-05-17T08:30:00
-      {{}, true}, {{"2024-05-17T08:30:00", "2024-05-17T08:30:00", {}}, true},
-      {{"2024-05-17", "2024-05-17", {"ENTER", "SPECIAL"}}, true}, {{"2024-05-17T08:30:01", "", {}}, false},
-      {{"", "2024-05-17T08:29:59", {}}, false}, {{"", "2024-05-16", {}}, false}, {{"", "", {"EXIT"}}, false}};
-  // clang-format on
-  for (const auto &[filter, passes] : cases)
-    EXPECT_EQ(Passes(filter, {"u", "g", "SPECIAL", "2024-05-17T08:30:00", ""}), passes) << filter.since;
-}
-
 using Output = std::tuple<int, std::string, std::string>; // exit status, standard output, standard error
 class LogcatTool : public ::testing::Test {
 protected:
@@ -135,6 +121,7 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   const std::vector<std::string> ids = {"gA", "gB"};
   const std::string a = Printed("gA", ids), b = Printed("gB", ids);
   const std::vector<std::string> lb = Split(b, "\n");
+  const std::string day = a.substr(a.find("\"time\":\"") + 8, 10); // today, unless midnight passed
   // clang-format off
   const std::pair<std::vector<std::string>, std::string> runs[] = {
       {{logs_}, a + b}, {{logs_ + "gB.log", "--", logs_ + "gB.log"}, b},
@@ -142,6 +129,7 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
       {{"--with-file", logs_ + "gA.log"}, Printed("gA", ids, true)}, {{}, a + b}, // none: the default folder
       {{"--type", "INIT", "--type=SPECIAL", logs_}, Split(a, "\n")[0] + "\n" + lb[0] + "\n" + lb[3] + "\n"},
       {{"--since=2999-01-01", logs_}, ""}, {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
+      {{"--since", day, "--until=" + day, logs_}, a + b}, // a day's bounds hold the whole day
       {{"--check", logs_}, logs_ + "gA.log: 3 records, 0 bad lines, 0 records with bytes not UTF-8\n" +
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};
   // clang-format on

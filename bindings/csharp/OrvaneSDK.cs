@@ -16,14 +16,20 @@ using System.Threading;
 
 namespace Orvane
 {
+    /// <summary>The level of a message from the library.</summary>
     public enum LogLevel { Info = 0, Warning = 1, Error = 2 }
 
+    /// <summary>
+    /// The analytics event log, the launch identity and the library's messages. Every call may come
+    /// from any thread; none throws.
+    /// </summary>
     public static class OrvaneSDK
     {
-        // The exports as they are. Texts are zero-terminated UTF-8 byte
-        // arrays. An identity result belongs to the caller, who releases it
-        // with oFreeText: the marshaller's own free (what a `string` result
-        // would get) is another allocator and crashes on the library's blocks.
+        /// <summary>
+        /// The exports as they are. Texts are zero-terminated UTF-8 byte arrays. An identity result
+        /// belongs to the caller, who releases it with <c>oFreeText</c>: the marshaller's own free (what
+        /// a <c>string</c> result would get) is another allocator and crashes on the library's blocks.
+        /// </summary>
         public static class Native
         {
             const string Library = "OrvaneSDK";
@@ -49,6 +55,8 @@ namespace Orvane
             public static extern IntPtr oAuthGetGameId();
             [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
             public static extern void oFreeText(IntPtr text);
+            [DllImport(Library, CallingConvention = CallingConvention.Cdecl)]
+            public static extern IntPtr oGetVersion();
         }
 
         static volatile Action<LogLevel, string> handler;
@@ -57,9 +65,12 @@ namespace Orvane
         static readonly Native.LogCallback nativeCallback = OnNativeLog;
         static int unloadHooked;
 
-        // Registers the one handler of the process (null unregisters). It
-        // at once receives (Info, "[OrvaneSDK] Logging initiated."). Returns
-        // only when no other thread is still inside the previous handler.
+        /// <summary>
+        /// Registers the one handler of the process; <c>null</c> unregisters. It at once receives
+        /// (Info, "[OrvaneSDK] Logging initiated."), then every message on the thread of the call that
+        /// caused it, before that call returns. Returns only when no other thread is still inside the
+        /// previous handler. An exception the handler throws is logged and goes no further.
+        /// </summary>
         public static void RegisterForLogs(Action<LogLevel, string> newHandler)
         {
             if (newHandler == null)
@@ -73,34 +84,49 @@ namespace Orvane
             Native.oRegisterForLogs(nativeCallback);
         }
 
+        /// <summary>Creates the library's storage folders when missing. The first event does it too.</summary>
         public static void Initialize() { Native.oInitialize(); }
 
-        // 0 on success, -1 when refused or not written (see the messages).
+        /// <summary>Starts the game's log with its INIT record, unless it has one.</summary>
+        /// <returns>0 when done, -1 when refused or not written (the messages say why).</returns>
         public static int AnalyticsInit(string gameId, string userId)
         {
             return Native.oAnalyticsInit(ToUtf8(gameId), ToUtf8(userId));
         }
 
+        /// <summary>Records that the user entered the game.</summary>
+        /// <returns>0 when written, -1 when refused or not written (the messages say why).</returns>
         public static int AnalyticsGameEnter(string gameId, string userId)
         {
             return Native.oAnalyticsGameEnter(ToUtf8(gameId), ToUtf8(userId));
         }
 
+        /// <summary>Records that the user left the game.</summary>
+        /// <returns>0 when written, -1 when refused or not written (the messages say why).</returns>
         public static int AnalyticsGameExit(string gameId, string userId)
         {
             return Native.oAnalyticsGameExit(ToUtf8(gameId), ToUtf8(userId));
         }
 
+        /// <summary>Records a game-defined event; <paramref name="extra"/> is stored as given.</summary>
+        /// <returns>0 when written, -1 when refused or not written (the messages say why).</returns>
         public static int AnalyticsSpecial(string gameId, string userId, string extra)
         {
             return Native.oAnalyticsSpecial(ToUtf8(gameId), ToUtf8(userId), ToUtf8(extra));
         }
 
-        // The launcher's values from the command line; "" when absent. On
-        // Windows the library keeps the low byte of each UTF-16 unit, so
-        // only ASCII values decode unchanged there.
+        /// <summary>
+        /// The user UUID the launcher put on the command line (after "--userUuid--"); "" when absent.
+        /// On Windows the library keeps the low byte of each UTF-16 unit, so only ASCII values decode
+        /// unchanged there.
+        /// </summary>
         public static string GetUserUuid() { return TakeText(Native.oAuthGetUserUuid()); }
+
+        /// <summary>The game id the launcher put on the command line (after "--gameId--"); "" when absent.</summary>
         public static string GetGameId() { return TakeText(Native.oAuthGetGameId()); }
+
+        /// <summary>The loaded library's version, "MAJOR.MINOR.PATCH".</summary>
+        public static string GetVersion() { return FromUtf8(Native.oGetVersion()); } // a constant: not freed
 
         // IL2CPP hands only static methods marked so to native code.
         [AOT.MonoPInvokeCallback(typeof(Native.LogCallback))]

@@ -177,13 +177,16 @@ void OpenLog(MessageBatch &messages, const Event &event, const std::string &path
 // Windows stretches them to its timer tick. This is the only lock a
 // recording takes, and it is given back before the call's messages go to
 // the host, so a callback may record again (src/README.md, "Locks").
+// False when another writer held it past the deadline; true when this call
+// holds it, or when the file system offers no lock (nothing can keep other
+// writers out there, and refusing would leave the log without events).
 bool LockWithinDeadline(LogFile &log) {
   const platform::Calls &os = platform::calls();
   const std::int64_t deadline = os.steady_milliseconds() + kLockWaitMilliseconds;
   for (;;) {
     switch (os.try_lock_file(log.handle)) {
     case platform::LockResult::kLocked: return log.locked = true;
-    case platform::LockResult::kFailed: return false;
+    case platform::LockResult::kFailed: return true;
     case platform::LockResult::kBusy: break;
     }
     if (os.steady_milliseconds() >= deadline) return false;
@@ -275,7 +278,7 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   // A torn first line would leave the log without a readable INIT line for
   // good; it is cut away while the lock still keeps other writers out. Later
   // lines are never cut: without the lock that could cut another's line.
-  if (!written && starts_log) os.truncate_file(log.handle, 0);
+  if (!written && starts_log && log.locked) os.truncate_file(log.handle, 0);
   written = log.Close() && written;
   if (!written) {
     if (init_first) messages.Add(LogLevel::Error, kInitEvent.write_failed);

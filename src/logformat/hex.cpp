@@ -13,6 +13,15 @@ constexpr char HexDigit(std::uint8_t nibble) {
   return static_cast<char>(nibble + (nibble > 9 ? 'a' - 10 : '0'));
 }
 
+// Both digits of each byte, high nibble first; returns the end.
+char *HexBytes(char *out, const std::uint8_t *bytes, std::size_t size) {
+  for (std::size_t i = 0; i < size; ++i) {
+    *out++ = HexDigit(static_cast<std::uint8_t>(bytes[i] >> 4));
+    *out++ = HexDigit(static_cast<std::uint8_t>(bytes[i] & 0x0f));
+  }
+  return out;
+}
+
 #if defined(__SSE2__) || defined(_M_X64)
 // 16 bytes to 32 digits in a handful of instructions: both nibbles of every
 // byte become digits side by side, then interleave high digit first.
@@ -30,12 +39,7 @@ void HexBlock(char *out, const std::uint8_t *bytes) {
   _mm_storeu_si128(reinterpret_cast<__m128i *>(out + 16), _mm_unpackhi_epi8(high, low));
 }
 #else
-void HexBlock(char *out, const std::uint8_t *bytes) {
-  for (int k = 0; k < 16; ++k) {
-    out[2 * k] = HexDigit(static_cast<std::uint8_t>(bytes[k] >> 4));
-    out[2 * k + 1] = HexDigit(static_cast<std::uint8_t>(bytes[k] & 0x0f));
-  }
-}
+void HexBlock(char *out, const std::uint8_t *bytes) { HexBytes(out, bytes, 16); }
 #endif
 
 // Each byte's value as a lowercase hex digit, or -1: one lookup per
@@ -57,10 +61,7 @@ void AppendHex(std::string &out, const std::uint8_t *bytes, std::size_t size) {
   // Ciphertext always comes in whole 16-byte blocks; other sizes end bytewise.
   std::size_t i = 0;
   for (; i + 16 <= size; i += 16, p += 32) HexBlock(p, bytes + i);
-  for (; i < size; ++i) {
-    *p++ = HexDigit(static_cast<std::uint8_t>(bytes[i] >> 4));
-    *p++ = HexDigit(static_cast<std::uint8_t>(bytes[i] & 0x0f));
-  }
+  HexBytes(p, bytes + i, size - i);
 }
 
 bool IsLowerHex(std::string_view text) {

@@ -1,5 +1,5 @@
 // The C# binding under mono against the built libOrvaneSDK.so, under a temporary XDG_DATA_HOME:
-//   mono orvane-binding-test.exe ORVANE-LOGCAT --userUuid--a1b2c3d4 --gameId--demo42
+//   mono orvane-binding-test.exe ORVANE-LOGCAT VERSION --userUuid--a1b2c3d4 --gameId--demo42
 using System;
 using System.Collections.Generic;
 using System.Diagnostics;
@@ -16,18 +16,19 @@ static class BindingTest {
 
     static int Main(string[] args) {
         Environment.SetEnvironmentVariable("XDG_DATA_HOME", Directory.CreateDirectory(data).FullName); // read at load
-        try { Reload(); Example(args[0]); return 0; }
+        try { Reload(); Example(args[0], args[1]); return 0; }
         catch (Exception e) { Console.WriteLine("FAILED: " + e.Message); return 1; }
         finally { Directory.Delete(data, true); }
     }
 
     // A game's first event on a machine where nothing is stored yet, with its identity from this
     // process's command line, then every other call; the log read back by orvane-logcat.
-    static void Example(string logcat) {
+    static void Example(string logcat, string version) {
         var heard = new List<string>();
         OrvaneSDK.RegisterForLogs((level, message) => heard.Add(level.ToString()[0] + message.Substring(12)));
         string user = OrvaneSDK.GetUserUuid(), game = OrvaneSDK.GetGameId(), extra = "caf\u00e9 \"\u2713\"";
-        Equal("a1b2c3d4 demo42 0 0 0 0 -1", string.Join(" ", user, game, OrvaneSDK.AnalyticsGameEnter(game, user),
+        Equal("a1b2c3d4 demo42 " + version + " 0 0 0 0 -1", string.Join(" ", user, game, OrvaneSDK.GetVersion(),
+            OrvaneSDK.AnalyticsGameEnter(game, user),
             OrvaneSDK.AnalyticsInit(game, user), OrvaneSDK.AnalyticsSpecial(game, user, extra),
             OrvaneSDK.AnalyticsGameExit(game, user), OrvaneSDK.AnalyticsGameEnter(null, user)), "identity, results");
         OrvaneSDK.Initialize();
