@@ -19,19 +19,18 @@ void ORVANE_CALL HearB(LogLevel level, const char *message) { Hear('B', level, m
 // Steps: a/b register A/B, 0 registers null, r reports a Warning "note";
 // "A0L" is A hearing Info "Logging initiated."
 TEST(LogChannel, DeliversToTheRegisteredCallbackOnly) {
-  const std::pair<const char *, const char *> cases[] = {{"ra", "A0L"},    {"ar", "A0LA1n"},
-                                                         {"a0r", "A0L"},   {"0rar", "A0LA1n"},
-                                                         {"aa", "A0LA0L"}, {"abr", "A0LB0LB1n"}};
+  // clang-format off
+  const std::pair<const char *, const char *> cases[] = {
+      {"ra", "A0L"}, {"ar", "A0LA1n"}, {"a0r", "A0L"}, {"0rar", "A0LA1n"}, {"aa", "A0LA0L"}, {"abr", "A0LB0LB1n"}};
   for (const auto &[steps, heard] : cases) {
     oRegisterForLogs(nullptr);
     g_heard.clear();
     for (const char *step = steps; *step; ++step)
       *step == 'r' ? LogToHost(LogLevel::Warning, "[OrvaneSDK] note")
-                   : oRegisterForLogs(*step == 'a'   ? HearA
-                                      : *step == 'b' ? HearB
-                                                     : nullptr);
+                   : oRegisterForLogs(*step == 'a' ? HearA : *step == 'b' ? HearB : nullptr);
     EXPECT_EQ(g_heard, heard) << steps;
   }
+  // clang-format on
   oRegisterForLogs(nullptr);
 }
 

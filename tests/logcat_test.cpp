@@ -73,7 +73,6 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
     EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
   // clang-format on
-  CloseKeyPool(pool);
 }
 
 using Output = std::tuple<int, std::string, std::string>; // exit status, standard output, standard error
@@ -134,8 +133,9 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};
   // clang-format on
   for (const auto &[args, expected] : runs) EXPECT_EQ(Run(args), Output(0, expected, "")) << args[0];
-  const std::string line = Split(*ReadFile(logs_ + "gB.log"), "\n")[2]; // piped, after an empty line
-  EXPECT_EQ(Run({"--key-game-id=gB"}, "\r\n" + line + "\r\n"), Output(0, lb[2] + "\n", ""));
+  // Piped after an empty line, followed: standard input is read to its end once.
+  const std::string line = Split(*ReadFile(logs_ + "gB.log"), "\n")[2];
+  EXPECT_EQ(Run({"--follow", "--key-game-id=gB"}, "\r\n" + line + "\r\n", 10), Output(0, lb[2] + "\n", ""));
   // Keyed by an empty game id, the fixed key text alone reads a line; by a game with no log, none does.
   Host({"init", "", "u4", "exit", "gA", "u4"}, 1); // the refused call makes it exit 1
   Host({"init", "gZ", "u5", "exit", "gA", "u5"});
@@ -145,7 +145,7 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   // Followed: the logs, then each new line once, the newest before it ends; one keyed by a new log's game;
   // a missing log is waited for.
   Output followed;
-  std::thread tail([&] { followed = Run({"--follow", "--type=SPECIAL", logs_, logs_ + "gW.log"}, "", 4); });
+  std::thread tail([&] { followed = Run({"--follow", "--type=SPECIAL", logs_, logs_ + "gW.log"}, "", 6); });
   Host({"enter", "gF", "u6", "special", "gB", "u6", "s"}, 0, 500);
   Host({"special", "gA", "u7", "t"}, 0, 500);
   Host({"exit", "gA", "u7"}, 0, 500);

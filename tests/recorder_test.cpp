@@ -34,7 +34,7 @@ const std::string kTorn = "(undecryptable)";
 bool g_reenter = true;
 void ORVANE_CALL RecordFromInside(LogLevel level, const char *message) {
   CaptureMessage(level, message);
-  if (g_reenter && message == kNeverInitialized.text)
+  if (g_reenter && message == kNeverInitialized.second)
     g_reenter = false, CaptureMessage(LogLevel::Info, oAnalyticsGameExit("g1", "u1") == 0 ? "nested 0" : "-1");
 }
 
@@ -119,13 +119,13 @@ void InjectBusyLock(platform::LockResult (*lock)(platform::FileHandle)) {
 }
 
 TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
-  struct Case {
+  struct Case { // initialised: the log already holds its INIT line; records: the log after the call
     const char *name;
-    bool initialised; // the log already holds its INIT line
+    bool initialised;
     void (*inject)();
     int result;
     std::vector<Message> messages;
-    std::vector<std::string> records; // after the call
+    std::vector<std::string> records;
   };
   const Message open_failed = A(2, "ENTER", "log file failed to open. Maybe a bad game_id (g1)?"),
                 write_failed = A(2, "ENTER", "log file failed to write."), ok = A(0, "ENTER", "OK");
@@ -197,6 +197,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
 // is written; one of 30 MiB (a 60 MiB line) goes in.
 TEST_F(RecorderTest, RecordTooLargeIsRefusedBeforeAnythingIsWritten) {
   ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
+  ASSERT_EQ(oAnalyticsInit(std::string(200, 'g').c_str(), "u1"), 0) << "a long game id makes no large record";
   Captured().clear();
   EXPECT_EQ(oAnalyticsSpecial("g1", "u1", std::string(std::size_t{32} << 20, 'x').c_str()), -1);
   EXPECT_EQ(Log(), std::vector<std::string>{Rec("INIT")});

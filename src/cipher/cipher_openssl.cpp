@@ -17,7 +17,6 @@ struct Session {
   // The block that the encrypt context chains its next block with: the IV
   // while nothing was encrypted, then the last ciphertext block.
   std::uint8_t chain[kIvSize];
-  bool chain_known = true; // false after a failure left the context unknown
 };
 
 namespace {
@@ -51,9 +50,9 @@ Session *OpenOpenSsl(const std::uint8_t *key, const std::uint8_t *iv) {
   std::memcpy(session->chain, iv, kIvSize);
   session->encrypt = NewContext(key, iv, 1);
   session->decrypt = NewContext(key, iv, 0);
-  // Records are padded here, so the context only ever sees whole blocks.
-  if (session->encrypt == nullptr || session->decrypt == nullptr ||
-      EVP_CIPHER_CTX_set_padding(session->encrypt, 0) != 1) {
+  // Records are padded here and the encryption is never finished, so the
+  // context only ever sees whole blocks and its own padding never applies.
+  if (session->encrypt == nullptr || session->decrypt == nullptr) {
     ERR_print_errors_fp(stderr);
     CloseOpenSsl(session);
     return nullptr;
@@ -70,14 +69,6 @@ Session *OpenOpenSsl(const std::uint8_t *key, const std::uint8_t *iv) {
 std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
   EVP_CIPHER_CTX *ctx = session->encrypt;
   if (size > static_cast<std::size_t>(INT32_MAX - 2 * kBlockSize)) return -1;
-  if (!session->chain_known) {
-    if (EVP_EncryptInit_ex(ctx, nullptr, nullptr, nullptr, session->iv) != 1) {
-      ERR_print_errors_fp(stderr);
-      return -1;
-    }
-    std::memcpy(session->chain, session->iv, kIvSize);
-    session->chain_known = true;
-  }
   const std::size_t total = CiphertextSize(size);
   if (size != 0) std::memmove(out, in, size);
   // PKCS#7: every padding byte holds the padding length.
@@ -86,8 +77,10 @@ std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
   int written = 0;
   if (EVP_EncryptUpdate(ctx, out, &written, out, static_cast<int>(total)) != 1 ||
       written != static_cast<int>(total)) {
-    session->chain_known = false;
     ERR_print_errors_fp(stderr);
+    // The stream's state is unknown now: it starts again from the IV.
+    EVP_EncryptInit_ex(ctx, nullptr, nullptr, nullptr, session->iv);
+    std::memcpy(session->chain, session->iv, kIvSize);
     return -1;
   }
   std::memcpy(session->chain, out + total - kBlockSize, kBlockSize);
@@ -97,9 +90,9 @@ std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
 std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
   EVP_CIPHER_CTX *ctx = session->decrypt;
   int first = 0, second = 0;
-  if (size == 0 || size % kBlockSize != 0 || size > static_cast<std::size_t>(INT32_MAX / 2)) return -1;
-  // The padding check writes nothing past `size`: OpenSSL holds back the last
-  // block until the final call.
+  if (size > static_cast<std::size_t>(INT32_MAX / 2)) return -1;
+  // The final call refuses empty input, a partial block and bad padding, and
+  // nothing is written past `size`: OpenSSL holds back the last block until then.
   bool ok = EVP_DecryptInit_ex(ctx, nullptr, nullptr, nullptr, session->iv) == 1 &&
             EVP_DecryptUpdate(ctx, out, &first, in, static_cast<int>(size)) == 1 &&
             EVP_DecryptFinal_ex(ctx, out + first, &second) == 1;

@@ -2,6 +2,7 @@
 
 #include "core/empty_text.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 
@@ -36,7 +37,8 @@ std::string FindValueAfterMarker(const platform::ArgumentList &args, std::string
     const std::size_t start = FindAfter(arg, marker);
     if (start == std::u16string::npos) continue;
     std::string value(arg.size() - start, '\0');
-    for (std::size_t i = start; i < arg.size(); ++i) value[i - start] = static_cast<char>(Narrow(arg[i]));
+    std::transform(arg.begin() + static_cast<std::ptrdiff_t>(start), arg.end(), value.begin(),
+                   [](char16_t unit) { return static_cast<char>(Narrow(unit)); });
     return value;
   }
   return {};

@@ -91,22 +91,13 @@ bool ReadString(Cursor &in, std::string &value) {
     const char c = in.text[in.at++];
     if (c == '"') return true;
     if (c != '\\' || in.AtEnd()) return false; // a control byte, or an escape cut off
-    switch (in.text[in.at++]) {
-    case '"': value += '"'; break;
-    case '\\': value += '\\'; break;
-    case '/': value += '/'; break;
-    case 'b': value += '\b'; break;
-    case 'f': value += '\f'; break;
-    case 'n': value += '\n'; break;
-    case 'r': value += '\r'; break;
-    case 't': value += '\t'; break;
-    case 'u': {
-      const auto code = ReadUnicodeEscape(in);
+    const char letter = in.text[in.at++];
+    if (const std::size_t k = kEscapeLetters.find(letter); k != std::string_view::npos) {
+      value += kEscapedBytes[k];
+    } else {
+      const auto code = letter == 'u' ? ReadUnicodeEscape(in) : std::nullopt;
       if (!code) return false;
       AppendUtf8(value, *code);
-      break;
-    }
-    default: return false;
     }
   }
 }

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <cstring>
+#include <utility>
 
 namespace orvane {
 namespace {
@@ -76,15 +77,12 @@ void AppendJsonEscaped(std::string &out, std::string_view value) {
     const auto c = static_cast<std::uint8_t>(value[i]);
     out.append(value.data() + run, i - run);
     run = i + 1;
-    switch (c) {
-    case '"': out += "\\\""; break;
-    case '\\': out += "\\\\"; break;
-    case '\b': out += "\\b"; break;
-    case '\f': out += "\\f"; break;
-    case '\n': out += "\\n"; break;
-    case '\r': out += "\\r"; break;
-    case '\t': out += "\\t"; break;
-    default: out += "\\u00"; AppendHex(out, &c, 1);
+    // Only `"`, `\` and bytes below 0x20 come here, so never a "/".
+    if (const std::size_t k = kEscapedBytes.find(static_cast<char>(c)); k != std::string_view::npos) {
+      out.append(1, '\\').append(1, kEscapeLetters[k]);
+    } else {
+      out += "\\u00";
+      AppendHex(out, &c, 1);
     }
   }
   out.append(value.data() + run, value.size() - run);
@@ -92,17 +90,21 @@ void AppendJsonEscaped(std::string &out, std::string_view value) {
 
 void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,
                        std::string_view type, std::string_view time, std::string_view extra) {
-  const std::string_view values[5] = {user_id, game_id, type, time, extra};
+  const std::pair<std::string_view, std::string_view> members[] = {{kMemberPrefix[0], user_id},
+                                                                   {kMemberPrefix[1], game_id},
+                                                                   {kMemberPrefix[2], type},
+                                                                   {kMemberPrefix[3], time},
+                                                                   {kMemberPrefix[4], extra}};
   std::size_t size = kRecordEnd.size();
   bool plain = true;
-  for (int k = 0; k < 5; ++k) {
-    size += kMemberPrefix[k].size() + values[k].size();
-    plain = plain && FirstToEscape(values[k]) == values[k].size();
+  for (const auto &[prefix, value] : members) {
+    size += prefix.size() + value.size();
+    plain = plain && FirstToEscape(value) == value.size();
   }
   if (!plain) {
-    for (int k = 0; k < 5; ++k) {
-      out += kMemberPrefix[k];
-      AppendJsonEscaped(out, values[k]);
+    for (const auto &[prefix, value] : members) {
+      out += prefix;
+      AppendJsonEscaped(out, value);
     }
     out += kRecordEnd;
     return;
@@ -112,7 +114,7 @@ void AppendEventRecord(std::string &out, std::string_view game_id, std::string_v
   const std::size_t start = out.size();
   out.resize(start + size);
   char *p = out.data() + start;
-  for (int k = 0; k < 5; ++k) p = Put(Put(p, kMemberPrefix[k]), values[k]);
+  for (const auto &[prefix, value] : members) p = Put(Put(p, prefix), value);
   Put(p, kRecordEnd);
 }
 

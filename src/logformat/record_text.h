@@ -12,6 +12,12 @@ namespace orvane {
 // Bytes of a record that are not values: member names, quotes, separators.
 inline constexpr std::size_t kRecordFixedBytes = 58;
 
+// The escapes JSON spells with a letter, both ways: a backslash and
+// kEscapeLetters[k] stand for kEscapedBytes[k]. The library never writes "\/",
+// which readers of JSON take for "/".
+inline constexpr std::string_view kEscapedBytes = "\"\\\b\f\n\r\t/";
+inline constexpr std::string_view kEscapeLetters = "\"\\bfnrt/";
+
 // Appends `value` as the inside of a JSON string: `"` and `\` are escaped and
 // bytes below 0x20 take their JSON escape; every other byte stands as it came.
 void AppendJsonEscaped(std::string &out, std::string_view value);

@@ -1,5 +1,7 @@
 #include "logformat/timestamp.h"
 
+#include <algorithm>
+
 namespace orvane {
 namespace {
 
@@ -7,9 +9,9 @@ struct CalendarTime {
   std::int64_t year, month, day, hour, minute, second; // month 1 to 12
 };
 
-std::int64_t FloorDiv(std::int64_t a, std::int64_t b) {
-  return a / b - ((a % b != 0) && ((a < 0) != (b < 0)));
-}
+// a / b rounded down, for a positive `b`: instants before 1970 fall on the
+// day before, not the day after.
+std::int64_t FloorDiv(std::int64_t a, std::int64_t b) { return a / b - (a % b < 0); }
 
 // Proleptic Gregorian calendar from a day count, valid for every int64 input
 // that matters; unlike gmtime it cannot fail, so the text is always a date.
@@ -32,42 +34,32 @@ CalendarTime UtcCalendar(std::int64_t seconds) {
   return t;
 }
 
-} // namespace
-
+// `value` in decimal, zeros in front up to `width` digits.
 std::string PadNumber(std::int64_t value, int width) {
   std::string digits = std::to_string(value);
   if (static_cast<int>(digits.size()) < width) digits.insert(0, width - digits.size(), '0');
   return digits;
 }
 
-namespace {
-
-// Writes the time stamp of `seconds` into `text`, reusing its buffer. Years
-// of four digits, all real clocks, are written digit by digit into place;
-// any other year takes the general padding, which keeps every digit.
+// Writes the time stamp of `seconds` into `text`, reusing its buffer (the
+// year's few digits fit in a string's own storage: nothing is allocated).
 void FormatTimestampInto(std::string &text, std::int64_t seconds) {
   // Keeps the year within what the calendar arithmetic handles without
   // overflow; real clocks are nowhere near either end.
   constexpr std::int64_t kLimit = INT64_C(1) << 50;
-  if (seconds > kLimit) seconds = kLimit;
-  if (seconds < -kLimit) seconds = -kLimit;
-  const CalendarTime t = UtcCalendar(seconds);
-  if (t.year < 0 || t.year > 9999) {
-    text = PadNumber(t.year, 4) + '-' + PadNumber(t.month, 2) + '-' + PadNumber(t.day, 2) + 'T' +
-           PadNumber(t.hour, 2) + ':' + PadNumber(t.minute, 2) + ':' + PadNumber(t.second, 2);
-    return;
-  }
-  char stamp[] = "0000-00-00T00:00:00";
-  const auto put = [&stamp](int at, std::int64_t value, int width) {
-    for (int i = at + width - 1; i >= at; --i, value /= 10) stamp[i] = static_cast<char>('0' + value % 10);
+  const CalendarTime t = UtcCalendar(std::clamp(seconds, -kLimit, kLimit));
+  char rest[] = "-00-00T00:00:00";
+  const auto put = [&rest](int at, std::int64_t value) {
+    rest[at] = static_cast<char>('0' + value / 10);
+    rest[at + 1] = static_cast<char>('0' + value % 10);
   };
-  put(0, t.year, 4);
-  put(5, t.month, 2);
-  put(8, t.day, 2);
-  put(11, t.hour, 2);
-  put(14, t.minute, 2);
-  put(17, t.second, 2);
-  text.assign(stamp, sizeof stamp - 1);
+  put(1, t.month);
+  put(4, t.day);
+  put(7, t.hour);
+  put(10, t.minute);
+  put(13, t.second);
+  // A year keeps every digit, four at least: year 10000 is not cut to 0000.
+  text.assign(PadNumber(t.year, 4)).append(rest, sizeof rest - 1);
 }
 
 } // namespace

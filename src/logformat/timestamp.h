@@ -7,10 +7,6 @@
 
 namespace orvane {
 
-// Decimal `value`, filled with leading "0" to at least `width` characters;
-// never cut.
-std::string PadNumber(std::int64_t value, int width);
-
 // The time stamp text of the instant `seconds` after 1970-01-01T00:00:00 UTC.
 std::string FormatTimestampAt(std::int64_t seconds);
 

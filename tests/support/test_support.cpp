@@ -10,10 +10,6 @@
 
 namespace orvane::testing {
 
-std::ostream &operator<<(std::ostream &out, const Message &message) {
-  return out << "{" << message.level << ", \"" << message.text << "\"}";
-}
-
 std::vector<Message> &Captured() {
   static std::vector<Message> messages;
   return messages;

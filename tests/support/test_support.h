@@ -11,7 +11,6 @@
 #include <gtest/gtest.h>
 
 #include <optional>
-#include <ostream>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -19,12 +18,7 @@
 
 namespace orvane::testing {
 
-struct Message {
-  int level;
-  std::string text;
-  bool operator==(const Message &) const = default;
-};
-std::ostream &operator<<(std::ostream &out, const Message &message);
+using Message = std::pair<int, std::string>; // a level, 0 Info to 2 Error, and its text
 std::vector<Message> &Captured();
 void ORVANE_CALL CaptureMessage(LogLevel level, const char *message);
 

@@ -19,9 +19,8 @@ const LogKey *PooledKey(KeyPool &pool, std::string_view game_id) {
 
 } // namespace
 
-void CloseKeyPool(KeyPool &pool) {
-  for (auto &[part, key] : pool.keys) CloseLogKey(key);
-  pool.keys.clear();
+KeyPool::~KeyPool() {
+  for (auto &[part, key] : keys) CloseLogKey(key);
 }
 
 bool AddCandidate(KeyCandidates &candidates, std::string_view game_id) {

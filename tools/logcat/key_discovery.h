@@ -15,11 +15,16 @@
 namespace orvane::logcat {
 
 // Cipher sessions shared by every file read, opened when first needed.
+// Owns the cipher session of every key it holds, closed with the pool.
 struct KeyPool {
   std::map<std::string, LogKey, std::less<>> keys; // by the bytes of the id that make the key
   bool failed = false; // a session could not be opened (the reason went to standard error)
+
+  KeyPool() = default;
+  KeyPool(const KeyPool &) = delete;
+  KeyPool &operator=(const KeyPool &) = delete;
+  ~KeyPool();
 };
-void CloseKeyPool(KeyPool &pool);
 
 // The game ids whose keys may read one file's lines, in the order tried.
 struct KeyCandidates {

@@ -79,9 +79,9 @@ bool ListFolderKeys(Source &source) {
   const fs::file_time_type time = fs::last_write_time(source.folder, error);
   if (error || time == source.folder_time) return false;
   source.folder_time = time;
-  bool added = false;
-  for (const std::string &id : GameIdsIn(source.folder)) added |= AddCandidate(source.keys, id);
-  return added;
+  const std::size_t known = source.keys.game_ids.size();
+  for (const std::string &id : GameIdsIn(source.folder)) AddCandidate(source.keys, id);
+  return source.keys.game_ids.size() != known;
 }
 
 bool AddSource(Reader &reader, const fs::path &path) {
@@ -321,9 +321,7 @@ int Run(int argc, char **argv) {
     if (!open) break;
     if (!any) std::this_thread::sleep_for(std::chrono::milliseconds(100));
   }
-  for (Source &source : reader.sources)
-    if (source.file != nullptr && !source.is_stdin) std::fclose(source.file);
-  CloseKeyPool(reader.pool);
+  // The files are read only: the process's end closes them.
   if (reader.pool.failed) {
     Complain("the cipher could not be prepared for some key");
     Raise(reader, 2);

@@ -1,7 +1,8 @@
 #include "valid_utf8.h"
 
+#include "logformat/hex.h"
+
 #include <cstdint>
-#include <cstring>
 
 namespace orvane::logcat {
 namespace {
@@ -37,24 +38,12 @@ std::size_t SequenceLength(std::string_view text, std::size_t i) {
   return length;
 }
 
-bool EightAscii(const char *p) {
-  std::uint64_t word;
-  std::memcpy(&word, p, 8);
-  return (word & 0x8080808080808080u) == 0;
-}
-
 } // namespace
 
 std::size_t AppendValidUtf8(std::string &out, std::string_view json) {
-  static constexpr char kHex[] = "0123456789abcdef";
   std::size_t escaped = 0, run = 0, i = 0;
   while (i < json.size()) {
-    // Records are almost always ASCII: skip it eight bytes at a time.
-    if (i + 8 <= json.size() && EightAscii(json.data() + i)) {
-      i += 8;
-      continue;
-    }
-    const auto c = static_cast<unsigned char>(json[i]);
+    const auto c = static_cast<std::uint8_t>(json[i]);
     if (c < 0x80) {
       ++i;
       continue;
@@ -65,8 +54,7 @@ std::size_t AppendValidUtf8(std::string &out, std::string_view json) {
     }
     out.append(json, run, i - run);
     out += "\\u00";
-    out += kHex[c >> 4];
-    out += kHex[c & 0x0f];
+    AppendHex(out, &c, 1);
     ++escaped;
     run = ++i;
   }
