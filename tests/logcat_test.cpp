@@ -21,9 +21,9 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
       {"{\"user_id\":\"a\\\"b\xff\x80\",\"game_id\":\"c\\\\d\",\"type\":\"j\xc3\xa9u\",\"time\":\"t\","
        R"("extra":"\b\f\n\r\t\u0001\u0000)" "\x7f\"}", // every escape the library writes; raw bytes
        {"a\"b\xff\x80", "c\\d", "j\xc3\xa9u", "t", std::string("\b\f\n\r\t\x01\0\x7f", 8)}},
-      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
+      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
        "\"game_id\":\"g\",\"user_id\":\"\\uDBFF\\uDFFF\" } ", // other writers' forms
-       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf"}}};
+       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80"}}};
   const std::string h = R"({"user_id":"u","game_id":"g","type":"T","time":"t")", refused[] = {
       "", "{}", h + "}", h + R"(,"extra":"x")", h + R"(,"extra":"x"}})", h + R"(,"user_id":"x"})",
       h + R"(,"extra":1})", h + R"(,"Extra":"x"})", h + R"(,"extra" "x"})", h + R"(,"extra":"x",})",
@@ -127,7 +127,7 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
       {{"--show-key", logs_}, Printed("gA", ids, false, true) + Printed("gB", ids, false, true)},
       {{"--with-file", logs_ + "gA.log"}, Printed("gA", ids, true)}, {{}, a + b}, // none: the default folder
       {{"--type", "INIT", "--type=SPECIAL", logs_}, Split(a, "\n")[0] + "\n" + lb[0] + "\n" + lb[3] + "\n"},
-      {{"--since=2999-01-01", logs_}, ""}, {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
+      {{"--since=2999-01-01T00:00:00", logs_}, ""}, {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
       {{"--since", day, "--until=" + day, logs_}, a + b}, // a day's bounds hold the whole day
       {{"--check", logs_}, logs_ + "gA.log: 3 records, 0 bad lines, 0 records with bytes not UTF-8\n" +
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};

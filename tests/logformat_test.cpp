@@ -32,7 +32,8 @@ TEST(LogFormat, RecordTextWithEscapes) {
   const std::pair<std::string, std::string> cases[] = {
       {"level=3", "level=3"}, {"", ""}, {"a\"b\\c\nd\re\tf\bg\fh", "a\\\"b\\\\c\\nd\\re\\tf\\bg\\fh"},
       {std::string("\x01\x1f\x20/\x7f\xc3\xa9\xff", 8), "\\u0001\\u001f /\x7f\xc3\xa9\xff"},
-      {"0123456\"", "0123456\\\""}, {"0123456\\", "0123456\\\\"}, {"01234567\"9", "01234567\\\"9"}, {"ABCDEFG\x01", "ABCDEFG\\u0001"},
+      {"0123456\"", "0123456\\\""}, {"0123456\\", "0123456\\\\"}, {"ABCDEFG\x01", "ABCDEFG\\u0001"},
+      {"01234567\"9", "01234567\\\"9"}, {"01234567\"9ABCDEFGHIJ", "01234567\\\"9ABCDEFGHIJ"}, // in a middle word
       {"0123456789ABCDE\x1b", "0123456789ABCDE\\u001b"}}; // a word of digits and capitals
   // clang-format on
   for (const auto &[value, escaped] : cases) {

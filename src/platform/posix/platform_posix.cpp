@@ -1,7 +1,7 @@
 // POSIX implementation of the platform table.
 #include "platform/platform.h"
 
-#include <algorithm>
+#include <chrono>
 #include <cerrno>
 #include <cstdlib>
 #include <ctime>
@@ -10,6 +10,8 @@
 #include <pwd.h>
 #include <sys/file.h>
 #include <sys/stat.h>
+#include <string_view>
+#include <thread>
 #include <unistd.h>
 
 namespace orvane::platform {
@@ -26,12 +28,12 @@ bool DirectoryExistsPosix(const char *path) {
 bool MakeDirectoryPosix(const char *path) { return ::mkdir(path, 0700) == 0; }
 
 bool MakePrivateDirectoriesPosix(const char *path) {
-  std::string partial(path);
+  const std::string_view whole(path);
   // Create each missing level from the top, so that a missing parent of the
   // data directory gets the same owner-only mode.
-  for (std::size_t i = 1; i <= partial.size(); ++i) {
-    if (i != partial.size() && partial[i] != '/') continue;
-    std::string level = partial.substr(0, i);
+  for (std::size_t end = 0; end != std::string_view::npos;) {
+    end = whole.find('/', end + 1);
+    const std::string level(whole.substr(0, end));
     if (::mkdir(level.c_str(), 0700) != 0 && errno != EEXIST) return false;
   }
   return DirectoryExistsPosix(path);
@@ -101,15 +103,12 @@ void UnlockFilePosix(FileHandle file) { ::flock(static_cast<int>(file), LOCK_UN)
 std::int64_t NowSecondsPosix() { return static_cast<std::int64_t>(::time(nullptr)); }
 
 std::int64_t SteadyMillisecondsPosix() {
-  struct timespec now;
-  ::clock_gettime(CLOCK_MONOTONIC, &now);
-  return static_cast<std::int64_t>(now.tv_sec) * 1000 + now.tv_nsec / 1000000;
+  const auto now = std::chrono::steady_clock::now().time_since_epoch();
+  return std::chrono::duration_cast<std::chrono::milliseconds>(now).count();
 }
 
 void SleepMillisecondsPosix(int milliseconds) {
-  // A signal may end the pause early; the caller's deadline decides.
-  struct timespec pause = {milliseconds / 1000, (milliseconds % 1000) * 1000000L};
-  ::nanosleep(&pause, nullptr);
+  std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
 }
 
 // Closes a descriptor on every path out, an allocation failure included.
@@ -121,7 +120,6 @@ struct Descriptor {
 };
 
 bool ArgumentListPosix(ArgumentList &args) {
-  args.clear();
   const Descriptor cmdline{::open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC)};
   if (cmdline.fd < 0) return false;
   std::string bytes;
@@ -135,7 +133,6 @@ bool ArgumentListPosix(ArgumentList &args) {
   }
   // Every argument ends in a zero byte (the last may not); each byte becomes
   // one unit so that narrowing gives the argument's bytes back unchanged.
-  args.reserve(static_cast<std::size_t>(std::count(bytes.begin(), bytes.end(), '\0')) + 1);
   for (std::size_t start = 0; start < bytes.size();) {
     std::size_t end = bytes.find('\0', start);
     if (end == std::string::npos) end = bytes.size();
