@@ -21,15 +21,15 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
       {"{\"user_id\":\"a\\\"b\xff\x80\",\"game_id\":\"c\\\\d\",\"type\":\"j\xc3\xa9u\",\"time\":\"t\","
        R"("extra":"\b\f\n\r\t\u0001\u0000)" "\x7f\"}", // every escape the library writes; raw bytes
        {"a\"b\xff\x80", "c\\d", "j\xc3\xa9u", "t", std::string("\b\f\n\r\t\x01\0\x7f", 8)}},
-      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
+      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
        "\"game_id\":\"g\",\"user_id\":\"\\uDBFF\\uDFFF\" } ", // other writers' forms
-       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80"}}};
+       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9"}}};
   const std::string h = R"({"user_id":"u","game_id":"g","type":"T","time":"t")", refused[] = {
       "", "{}", h + "}", h + R"(,"extra":"x")", h + R"(,"extra":"x"}})", h + R"(,"user_id":"x"})",
       h + R"(,"extra":1})", h + R"(,"Extra":"x"})", h + R"(,"extra" "x"})", h + R"(,"extra":"x",})",
       h + R"("extra":"x"})", h + ",\"extra\":\"a\x01}", h + R"(,"extra":"\x})", h + R"(,"extra":"\u00g0"})",
       h + R"(,"extra":"\u0})", h + R"(,"extra":"\ud83d})", h + R"(,"extra":"\udfff"})",
-      h + R"(,"extra":"\ud83d\u0041})", h + R"(,"extra":"x)", h + R"(,"extra":"x\)"};
+      h + R"(,"extra":"\ud83d\u0041"})", h + R"(,"extra":"x)", h + R"(,"extra":"x\)"};
   // clang-format on
   for (const auto &[text, expected] : records) EXPECT_EQ(ParseEventRecord(text), expected) << text;
   for (const std::string &text : refused) EXPECT_EQ(ParseEventRecord(text), std::nullopt) << text;
@@ -73,6 +73,10 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
     EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
   // clang-format on
+  cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * { return nullptr; };
+  KeyCandidates unusable{{"g4"}};
+  EXPECT_EQ(ReadLine(pool, unusable, good, buf, r), F::kBadPadding);
+  EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
 }
 
 using Output = std::tuple<int, std::string, std::string>; // exit status, standard output, standard error
@@ -133,9 +137,9 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};
   // clang-format on
   for (const auto &[args, expected] : runs) EXPECT_EQ(Run(args), Output(0, expected, "")) << args[0];
-  // Piped after an empty line, followed: standard input is read to its end once.
+  // Piped after an empty line and ended by a CR alone, followed: standard input is read to its end once.
   const std::string line = Split(*ReadFile(logs_ + "gB.log"), "\n")[2];
-  EXPECT_EQ(Run({"--follow", "--key-game-id=gB"}, "\r\n" + line + "\r\n", 10), Output(0, lb[2] + "\n", ""));
+  EXPECT_EQ(Run({"--follow", "--key-game-id=gB"}, "\r\n" + line + "\r", 10), Output(0, lb[2] + "\n", ""));
   // Keyed by an empty game id, the fixed key text alone reads a line; by a game with no log, none does.
   Host({"init", "", "u4", "exit", "gA", "u4"}, 1); // the refused call makes it exit 1
   Host({"init", "gZ", "u5", "exit", "gA", "u5"});
