@@ -72,7 +72,9 @@ TEST(Cipher, EveryLengthDecryptsWhole) {
       return std::ptrdiff_t{-1};
     };
     EXPECT_FALSE(EncryptRecordText(state, "{}", hex));
-    cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * { return nullptr; };
+    cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * {
+      return nullptr;
+    };
     EXPECT_FALSE(EncryptRecordText(fresh, "{}", hex));
   }
   EXPECT_EQ(hex, "kept");

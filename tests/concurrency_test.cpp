@@ -22,7 +22,8 @@ TEST_F(SandboxTest, ThreadsShareLogs) {
   for (int t = 0; t < kThreads; ++t)
     running.emplace_back([t] {
       for (int i = 0; i < kEvents; ++i) {
-        const std::string game = i % 2 ? "own-" + std::to_string(t) : "shared", tag = game + "/" + std::to_string(i);
+        const std::string game = i % 2 ? "own-" + std::to_string(t) : "shared",
+                          tag = game + "/" + std::to_string(i);
         EXPECT_EQ(oAnalyticsSpecial(game.c_str(), "u1", tag.c_str()), 0);
       }
     });
@@ -40,7 +41,8 @@ TEST_F(SandboxTest, ThreadsShareLogs) {
     const std::string game = t < kThreads ? "own-" + std::to_string(t) : "shared";
     const std::vector<std::string> records = Records(LogPath(game), key);
     ASSERT_EQ(records.size(), 1u + (t < kThreads ? kEvents / 2 : expected.size())) << game;
-    EXPECT_EQ(records[0], R"({"user_id":"u1","game_id":")" + game + R"(","type":"INIT","time":"T","extra":""})");
+    EXPECT_EQ(records[0],
+              R"({"user_id":"u1","game_id":")" + game + R"(","type":"INIT","time":"T","extra":""})");
     for (std::size_t i = 1; i < records.size() && t == kThreads; ++i) {
       const std::size_t start = records[i].find("shared/");
       shared.insert(records[i].substr(start, records[i].find('"', start) - start));

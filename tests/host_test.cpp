@@ -12,8 +12,8 @@ namespace {
 TEST(HostTest, AGameSessionOnANewMachine) {
   const std::string data = MakeTempDirectory();
   const ChildResult run = RunChild(ORVANE_HOST_PATH,
-                                   {"C:\\--gameId--space race\\game.exe", "--library", ORVANE_LIBRARY_PATH, "uuid",
-                                    "gameid", "enter", "g1", "u1", "exit-at-exit", "g1", "u1", "--",
+                                   {"C:\\--gameId--space race\\game.exe", "--library", ORVANE_LIBRARY_PATH,
+                                    "uuid", "gameid", "enter", "g1", "u1", "exit-at-exit", "g1", "u1", "--",
                                     "--userUuid--j\xc3\xa9r", "--gameId--g9"},
                                    {{"XDG_DATA_HOME", data}});
   EXPECT_EQ(run.exit_code, 0);

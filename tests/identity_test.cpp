@@ -53,8 +53,10 @@ TEST_F(SandboxTest, IdentityResultsAndMessages) {
     std::string uuid, game_id; // empty: the constant empty text
     std::vector<Message> messages;
   };
-  const Message uuid_ok{0, "[OrvaneSDK] Authentication - OK"}, uuid_failed{2, "[OrvaneSDK] Authentication - Failed"};
-  const Message game_ok{0, "[OrvaneSDK] Return GameID - OK"}, game_empty{2, "[OrvaneSDK] Return GameID - Empty"};
+  const Message uuid_ok{0, "[OrvaneSDK] Authentication - OK"},
+      uuid_failed{2, "[OrvaneSDK] Authentication - Failed"};
+  const Message game_ok{0, "[OrvaneSDK] Return GameID - OK"},
+      game_empty{2, "[OrvaneSDK] Return GameID - Empty"};
   const std::u16string exe = U("demo.exe");
   // clang-format off
   const Case cases[] = {

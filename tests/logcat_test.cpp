@@ -73,7 +73,9 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
     EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
   // clang-format on
-  cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * { return nullptr; };
+  cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * {
+    return nullptr;
+  };
   KeyCandidates unusable{{"g4"}};
   EXPECT_EQ(ReadLine(pool, unusable, good, buf, r), F::kBadPadding);
   EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
@@ -173,6 +175,8 @@ TEST_F(LogcatTool, UsageErrorsHelpAndVersion) {
   for (Output run; const auto &[args, message] : cases)
     EXPECT_TRUE(std::get<0>(run = Run(args)) == 2 && std::get<2>(run).find(message) != std::string::npos)
         << message;
+  const std::string waiting = "orvane-logcat: " + logs_ + ": does not exist yet; waiting for it\n";
+  EXPECT_EQ(Run({"--follow"}, "", 2), Output(-1, "", waiting)) << "said once";
   EXPECT_EQ(Run({"--help"}), Output(0, std::string(kHelpText), ""));
   EXPECT_EQ(Run({"--version"}), Output(0, "orvane-logcat " ORVANE_VERSION "\n", ""));
 }

@@ -40,8 +40,8 @@ TEST(LogFormat, RecordTextWithEscapes) {
     std::string out = "kept:";
     AppendEventRecord(out, "1234", value, "SPECIAL", "2024-05-17T08:30:00", value);
     EXPECT_EQ(out, R"(kept:{"user_id":")" + escaped +
-                       R"(","game_id":"1234","type":"SPECIAL","time":"2024-05-17T08:30:00","extra":")" + escaped +
-                       "\"}");
+                       R"(","game_id":"1234","type":"SPECIAL","time":"2024-05-17T08:30:00","extra":")" +
+                       escaped + "\"}");
   }
 }
 
@@ -60,6 +60,7 @@ TEST(LogFormat, HexBothWays) {
   std::string hex = "kept:";
   AppendHex(hex, bytes, sizeof bytes);
   EXPECT_EQ(hex, "kept:f00a80ff000f1e2d3c4b5a69788796a5b4c3d2e1");
+  EXPECT_EQ(hex.c_str()[hex.size()], '\0') << "nothing written past the end";
   std::vector<std::uint8_t> decoded;
   ASSERT_TRUE(DecodeHex(hex.substr(5), decoded));
   EXPECT_EQ(decoded, std::vector<std::uint8_t>(bytes, bytes + sizeof bytes));

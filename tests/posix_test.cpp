@@ -32,7 +32,8 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
   const mode_t saved = ::umask(0);
   ASSERT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
   ::umask(saved);
-  for (const std::string &dir : {base_ + "/home", where_.base, where_.root, where_.logs}) EXPECT_EQ(ModeOf(dir), 0700u) << dir;
+  for (const std::string &dir : {base_ + "/home", where_.base, where_.root, where_.logs})
+    EXPECT_EQ(ModeOf(dir), 0700u) << dir;
   EXPECT_EQ(ModeOf(LogPath("g1")), 0600u);
   WriteFile(base_ + "/outside", "kept");
   ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600), 0);
@@ -42,7 +43,8 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameEnter(game.c_str(), "u1"), -1);
     EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - log file failed to open. "
-                                                    "Maybe a bad game_id (" + game + ")?"}}));
+                                                    "Maybe a bad game_id (" +
+                                                        game + ")?"}}));
   }
   EXPECT_EQ(ReadFile(base_ + "/outside"), "kept");
   EXPECT_FALSE(std::filesystem::exists(base_ + "/planted"));
@@ -109,7 +111,10 @@ TEST_F(PosixTest, PlatformCallsOnRealFiles) {
 // ends (measured by glibc; a sanitizer's allocator reports nothing here).
 TEST_F(PosixTest, LargeEventsGiveTheirBuffersBack) {
   ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
-  const auto in_use = [] { const struct mallinfo2 heap = ::mallinfo2(); return heap.uordblks + heap.hblkhd; };
+  const auto in_use = [] {
+    const struct mallinfo2 heap = ::mallinfo2();
+    return heap.uordblks + heap.hblkhd;
+  };
   const std::string user(std::size_t{3} << 19, 'u'); // 1.5 MiB records, 3 MiB lines, the INIT line's too
   const std::size_t before = in_use();
   EXPECT_EQ(oAnalyticsGameEnter("g2", user.c_str()), 0);

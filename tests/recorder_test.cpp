@@ -34,33 +34,40 @@ bool g_reenter = true;
 void ORVANE_CALL RecordFromInside(LogLevel level, const char *message) {
   CaptureMessage(level, message);
   if (g_reenter && message == kNeverInitialized.second)
-    g_reenter = false, CaptureMessage(LogLevel::Info, oAnalyticsGameExit("g1", "u1") == 0 ? "nested 0" : "-1");
+    g_reenter = false,
+    CaptureMessage(LogLevel::Info, oAnalyticsGameExit("g1", "u1") == 0 ? "nested 0" : "-1");
 }
 
 TEST_F(RecorderTest, ALogFromItsFirstEventOn) {
   oRegisterForLogs(RecordFromInside);
   Captured().clear();
   EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  EXPECT_EQ(Captured(), (std::vector<Message>{A(0, "ENTER", "SDK was never initialized. Initializing the SDK."),
-                                              {0, "[OrvaneSDK] Initialize() - OK."}, kNeverInitialized,
-                                              A(0, "EXIT", "OK"), {0, "nested 0"}, A(0, "INIT", "OK"),
-                                              A(0, "ENTER", "OK")}));
+  EXPECT_EQ(Captured(),
+            (std::vector<Message>{A(0, "ENTER", "SDK was never initialized. Initializing the SDK."),
+                                  {0, "[OrvaneSDK] Initialize() - OK."},
+                                  kNeverInitialized,
+                                  A(0, "EXIT", "OK"),
+                                  {0, "nested 0"},
+                                  A(0, "INIT", "OK"),
+                                  A(0, "ENTER", "OK")}));
   EXPECT_EQ(Split(*ReadFile(LogPath("g1")), "\n").size(), 3u) << "line breaks only between lines";
   Captured().clear();
   EXPECT_EQ(oAnalyticsInit("g1", "u1"), 0);
   EXPECT_EQ(oAnalyticsSpecial("g1", "u1", "score=10") + oAnalyticsSpecial("g1", "u1", nullptr), 0);
   EXPECT_EQ(Captured(), (std::vector<Message>{A(1, "INIT", "log had been already initialized."),
                                               A(0, "SPECIAL", "OK"), A(0, "SPECIAL", "OK")}));
-  EXPECT_EQ(Log(), (std::vector<std::string>{Rec("INIT"), Rec("ENTER"), Rec("EXIT"), Rec("SPECIAL", "score=10"),
-                                             Rec("SPECIAL")}));
+  EXPECT_EQ(Log(), (std::vector<std::string>{Rec("INIT"), Rec("ENTER"), Rec("EXIT"),
+                                             Rec("SPECIAL", "score=10"), Rec("SPECIAL")}));
 }
 
 // A refused call sends one Error and touches nothing; control bytes of a game
 // id are shown as \xNN, so that an id cannot forge lines in the host's log.
 TEST_F(RecorderTest, RefusedCallsTouchNothing) {
-  const std::pair<const char *, const char *> refused[] = {{nullptr, ""}, {"", nullptr}, {"g1", nullptr}, {"g1", ""}};
+  const std::pair<const char *, const char *> refused[] = {
+      {nullptr, ""}, {"", nullptr}, {"g1", nullptr}, {"g1", ""}};
   for (const auto &[game, user] : refused) EXPECT_EQ(oAnalyticsGameEnter(game, user), -1);
-  const Message game = A(2, "ENTER", "failed. Game id is empty"), user = A(2, "ENTER", "failed. User id is empty");
+  const Message game = A(2, "ENTER", "failed. Game id is empty"),
+                user = A(2, "ENTER", "failed. User id is empty");
   EXPECT_EQ(Captured(), (std::vector<Message>{game, game, user, user}));
   std::filesystem::create_directories(where_.logs);
   // clang-format off
@@ -71,8 +78,8 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
   for (const auto &[id, shown] : hostile) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsInit(id.c_str(), "u1"), -1);
-    EXPECT_EQ(Captured(),
-              std::vector<Message>{A(2, "INIT", "log file failed to open. Maybe a bad game_id (" + shown + ")?")});
+    EXPECT_EQ(Captured(), std::vector<Message>{
+                              A(2, "INIT", "log file failed to open. Maybe a bad game_id (" + shown + ")?")});
   }
   EXPECT_TRUE(std::filesystem::is_empty(where_.logs));
   EXPECT_EQ(std::distance(std::filesystem::recursive_directory_iterator(base_), {}), 4);
@@ -192,7 +199,8 @@ TEST_F(RecorderTest, RecordTooLargeIsRefusedBeforeAnythingIsWritten) {
   EXPECT_EQ(Log(), std::vector<std::string>{Rec("INIT")});
   const std::size_t largest = (std::size_t{32} << 20) - 16 - 88; // 88: the rest of its record; 16: padding
   EXPECT_EQ(oAnalyticsSpecial("g1", "u1", std::string(largest, 'x').c_str()), 0);
-  EXPECT_EQ(Captured(), (std::vector<Message>{A(2, "SPECIAL", "failed. Record too large."), A(0, "SPECIAL", "OK")}));
+  EXPECT_EQ(Captured(),
+            (std::vector<Message>{A(2, "SPECIAL", "failed. Record too large."), A(0, "SPECIAL", "OK")}));
 }
 
 } // namespace

@@ -20,7 +20,8 @@ bool IsDeviceName(std::string_view stem) {
   while (!stem.empty() && stem.back() == ' ') stem.remove_suffix(1);
   for (std::string_view name : {"CON", "PRN", "AUX", "NUL", "CONIN$", "CONOUT$"})
     if (EqualsIgnoringCase(stem, name)) return true;
-  if (!EqualsIgnoringCase(stem.substr(0, 3), "COM") && !EqualsIgnoringCase(stem.substr(0, 3), "LPT")) return false;
+  if (!EqualsIgnoringCase(stem.substr(0, 3), "COM") && !EqualsIgnoringCase(stem.substr(0, 3), "LPT"))
+    return false;
   std::string_view digit = stem.substr(3);
   if (digit.size() == 2 && digit[0] == '\xc2') digit.remove_prefix(1);
   if (digit.size() != 1) return false;

@@ -58,7 +58,7 @@ std::size_t FirstToEscape(std::string_view value) {
 // The record's five members in order; each value stands between its prefix
 // and the next prefix (or the closing text).
 constexpr std::string_view kMemberPrefix[] = {"{\"user_id\":\"", "\",\"game_id\":\"", "\",\"type\":\"",
-                                               "\",\"time\":\"", "\",\"extra\":\""};
+                                              "\",\"time\":\"", "\",\"extra\":\""};
 constexpr std::string_view kRecordEnd = "\"}";
 static_assert(kMemberPrefix[0].size() + kMemberPrefix[1].size() + kMemberPrefix[2].size() +
                   kMemberPrefix[3].size() + kMemberPrefix[4].size() + kRecordEnd.size() ==

@@ -1,16 +1,16 @@
 // POSIX implementation of the platform table.
 #include "platform/platform.h"
 
-#include <chrono>
 #include <cerrno>
+#include <chrono>
 #include <cstdlib>
 #include <ctime>
 #include <fcntl.h>
 #include <pthread.h>
 #include <pwd.h>
+#include <string_view>
 #include <sys/file.h>
 #include <sys/stat.h>
-#include <string_view>
 #include <thread>
 #include <unistd.h>
 
