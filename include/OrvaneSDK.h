@@ -137,11 +137,15 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  *                                                  name (see below)
  *   ERROR   "log file failed to write."            result -1 (disk full, I/O); a
  *                                                  first line that did not go
- *                                                  in whole is cut away
+ *                                                  in whole is cut away (on a
+ *                                                  file system that locks
+ *                                                  files)
  *   ERROR   "log file is locked by another process."
  *                                                  result -1: the log was
  *                                                  empty and another writer
  *                                                  held it for over a second
+ *                                                  (a file system without
+ *                                                  locks never refuses)
  *   ERROR   "failed. Record encryption failed."    result -1
  *   ERROR   "failed. Record too large."            result -1: the line would
  *                                                  exceed 64 MiB; nothing
