@@ -4,7 +4,6 @@
 
 #include <cstdint>
 #include <cstring>
-#include <utility>
 
 namespace orvane {
 namespace {
@@ -90,31 +89,28 @@ void AppendJsonEscaped(std::string &out, std::string_view value) {
 
 void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,
                        std::string_view type, std::string_view time, std::string_view extra) {
-  const std::pair<std::string_view, std::string_view> members[] = {{kMemberPrefix[0], user_id},
-                                                                   {kMemberPrefix[1], game_id},
-                                                                   {kMemberPrefix[2], type},
-                                                                   {kMemberPrefix[3], time},
-                                                                   {kMemberPrefix[4], extra}};
-  std::size_t size = kRecordEnd.size();
+  const std::string_view values[] = {user_id, game_id, type, time, extra};
   bool plain = true;
-  for (const auto &[prefix, value] : members) {
-    size += prefix.size() + value.size();
-    plain = plain && FirstToEscape(value) == value.size();
-  }
+  for (const std::string_view value : values) plain = plain && FirstToEscape(value) == value.size();
   if (!plain) {
-    for (const auto &[prefix, value] : members) {
-      out += prefix;
+    for (std::size_t k = 0; const std::string_view value : values) {
+      out += kMemberPrefix[k++];
       AppendJsonEscaped(out, value);
     }
     out += kRecordEnd;
     return;
   }
   // Nothing to escape, the usual case: the size is known, so the text is
-  // copied in place after one resize.
+  // copied in place after one resize, the fixed parts with constant sizes.
   const std::size_t start = out.size();
-  out.resize(start + size);
+  out.resize(start + kRecordFixedBytes + user_id.size() + game_id.size() + type.size() + time.size() +
+             extra.size());
   char *p = out.data() + start;
-  for (const auto &[prefix, value] : members) p = Put(Put(p, prefix), value);
+  p = Put(Put(p, kMemberPrefix[0]), user_id);
+  p = Put(Put(p, kMemberPrefix[1]), game_id);
+  p = Put(Put(p, kMemberPrefix[2]), type);
+  p = Put(Put(p, kMemberPrefix[3]), time);
+  p = Put(Put(p, kMemberPrefix[4]), extra);
   Put(p, kRecordEnd);
 }
 
