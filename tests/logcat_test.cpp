@@ -21,9 +21,9 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
       {"{\"user_id\":\"a\\\"b\xff\x80\",\"game_id\":\"c\\\\d\",\"type\":\"j\xc3\xa9u\",\"time\":\"t\","
        R"("extra":"\b\f\n\r\t\u0001\u0000)" "\x7f\"}", // every escape the library writes; raw bytes
        {"a\"b\xff\x80", "c\\d", "j\xc3\xa9u", "t", std::string("\b\f\n\r\t\x01\0\x7f", 8)}},
-      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
+      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\\ud800\\udc00\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
        "\"game_id\":\"g\",\"user_id\":\"\\uDBFF\\uDFFF\" } ", // other writers' forms
-       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9"}}};
+       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9\xf0\x90\x80\x80"}}};
   const std::string h = R"({"user_id":"u","game_id":"g","type":"T","time":"t")", refused[] = {
       "", "{}", h + "}", h + R"(,"extra":"x")", h + R"(,"extra":"x"}})", h + R"(,"user_id":"x"})",
       h + R"(,"extra":1})", h + R"(,"Extra":"x"})", h + R"(,"extra" "x"})", h + R"(,"extra":"x",})",
@@ -123,18 +123,21 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   Host({"init", "gA", "u1", "enter", "gB", "u1"});          // both logs keyed by gA
   Host({"enter", "gB", "u2", "enter", "gA", "u2"});         // ... then by gB
   Host({"exit", "gA", "u3", "special", "gB", "u3", extra}); // ... then by gA again
+  WriteFile(logs_ + "notes.txt", "not a log");              // not read
   const std::vector<std::string> ids = {"gA", "gB"};
   const std::string a = Printed("gA", ids), b = Printed("gB", ids);
   const std::vector<std::string> lb = Split(b, "\n");
-  const std::string day = a.substr(a.find("\"time\":\"") + 8, 10); // today, unless midnight passed
+  const std::string first = a.substr(a.find("\"time\":\"") + 8, 19),
+                    day = first.substr(0, 10); // the first record's
   // clang-format off
   const std::pair<std::vector<std::string>, std::string> runs[] = {
       {{logs_}, a + b}, {{logs_ + "gB.log", "--", logs_ + "gB.log"}, b},
       {{"--show-key", logs_}, Printed("gA", ids, false, true) + Printed("gB", ids, false, true)},
       {{"--with-file", logs_ + "gA.log"}, Printed("gA", ids, true)}, {{}, a + b}, // none: the default folder
-      {{"--type", "INIT", "--type=SPECIAL", logs_}, Split(a, "\n")[0] + "\n" + lb[0] + "\n" + lb[3] + "\n"},
+      {{"--type", "INIT", "--type=EXIT", "--type=SPECIAL", logs_},
+       Split(a, "\n")[0] + "\n" + Split(a, "\n")[2] + "\n" + lb[0] + "\n" + lb[3] + "\n"},
       {{"--since=2999-01-01T00:00:00", logs_}, ""}, {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
-      {{"--since", day, "--until=" + day, logs_}, a + b}, // a day's bounds hold the whole day
+      {{"--since", first, "--until=" + day, logs_}, a + b}, // bounds hold their own second and day
       {{"--check", logs_}, logs_ + "gA.log: 3 records, 0 bad lines, 0 records with bytes not UTF-8\n" +
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};
   // clang-format on

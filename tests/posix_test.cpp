@@ -5,6 +5,7 @@
 
 #include <atomic>
 #include <csignal>
+#include <fcntl.h>
 #include <filesystem>
 #include <malloc.h>
 #include <pthread.h>
@@ -39,6 +40,12 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
   ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600), 0);
   std::filesystem::create_symlink(base_ + "/outside", LogPath("link"));
   std::filesystem::create_symlink(base_ + "/planted", LogPath("dangling"));
+  const auto open_files = [] {
+    return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
+  };
+  // With a reader the FIFO opens without blocking: only its type tells it from a log.
+  const int reader = ::open(LogPath("fifo").c_str(), O_RDONLY | O_NONBLOCK);
+  const auto before = open_files();
   for (const std::string game : {"fifo", "link", "dangling"}) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameEnter(game.c_str(), "u1"), -1);
@@ -46,6 +53,8 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
                                                     "Maybe a bad game_id (" +
                                                         game + ")?"}}));
   }
+  EXPECT_EQ(open_files(), before) << "a refused log leaves no descriptor open";
+  ::close(reader);
   EXPECT_EQ(ReadFile(base_ + "/outside"), "kept");
   EXPECT_FALSE(std::filesystem::exists(base_ + "/planted"));
 }
