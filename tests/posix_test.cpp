@@ -37,16 +37,16 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
     EXPECT_EQ(ModeOf(dir), 0700u) << dir;
   EXPECT_EQ(ModeOf(LogPath("g1")), 0600u);
   WriteFile(base_ + "/outside", "kept");
-  ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600), 0);
+  ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600) | ::mkfifo(LogPath("lonely").c_str(), 0600), 0);
   std::filesystem::create_symlink(base_ + "/outside", LogPath("link"));
   std::filesystem::create_symlink(base_ + "/planted", LogPath("dangling"));
   const auto open_files = [] {
     return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
   };
-  // With a reader the FIFO opens without blocking: only its type tells it from a log.
+  // With a reader a FIFO opens at once, so only its type tells it from a log; without, opening must not wait.
   const int reader = ::open(LogPath("fifo").c_str(), O_RDONLY | O_NONBLOCK);
   const auto before = open_files();
-  for (const std::string game : {"fifo", "link", "dangling"}) {
+  for (const std::string game : {"fifo", "lonely", "link", "dangling"}) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameEnter(game.c_str(), "u1"), -1);
     EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - log file failed to open. "
