@@ -27,7 +27,8 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
   const std::string h = R"({"user_id":"u","game_id":"g","type":"T","time":"t")", refused[] = {
       "", "{}", h + "}", h + R"(,"extra":"x")", h + R"(,"extra":"x"}})", h + R"(,"user_id":"x"})",
       h + R"(,"extra":1})", h + R"(,"Extra":"x"})", h + R"(,"extra" "x"})", h + R"(,"extra":"x",})",
-      h + R"("extra":"x"})", h + ",\"extra\":\"a\x01}", h + R"(,"extra":"\x})", h + R"(,"extra":"\u00g0"})",
+      h + R"("extra":"x"})", h + ",\"extra\":\"a\x01}", h + ",\"extra\":\"a\x01n\"}",
+      h + R"(,"extra":"\x})", h + R"(,"extra":"\u00g0"})",
       h + R"(,"extra":"\u0})", h + R"(,"extra":"\ud83d})", h + R"(,"extra":"\udfff"})",
       h + R"(,"extra":"\ud83d\u0041"})", h + R"(,"extra":"x)", h + R"(,"extra":"x\)"};
   // clang-format on
