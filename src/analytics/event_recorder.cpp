@@ -244,9 +244,9 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   // then is the file locked; its size is taken again whatever the wait gave,
   // since another writer may have started it meanwhile.
   if (log.size == 0) {
-    const bool locked = LockWithinDeadline(log);
+    const bool may_start = LockWithinDeadline(log);
     log.size = os.file_size(log.handle);
-    if (log.size == 0 && !locked) {
+    if (log.size == 0 && !may_start) {
       messages.Add(LogLevel::Error, type.locked_out);
       return -1;
     }

@@ -13,13 +13,12 @@ constexpr char HexDigit(std::uint8_t nibble) {
   return static_cast<char>(nibble + (nibble > 9 ? 'a' - 10 : '0'));
 }
 
-// Both digits of each byte, high nibble first; returns the end.
-char *HexBytes(char *out, const std::uint8_t *bytes, std::size_t size) {
+// Both digits of each byte, high nibble first.
+void HexBytes(char *out, const std::uint8_t *bytes, std::size_t size) {
   for (std::size_t i = 0; i < size; ++i) {
     *out++ = HexDigit(static_cast<std::uint8_t>(bytes[i] >> 4));
     *out++ = HexDigit(static_cast<std::uint8_t>(bytes[i] & 0x0f));
   }
-  return out;
 }
 
 #if defined(__SSE2__) || defined(_M_X64)

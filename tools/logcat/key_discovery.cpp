@@ -23,11 +23,10 @@ KeyPool::~KeyPool() {
   for (auto &[part, key] : keys) CloseLogKey(key);
 }
 
-bool AddCandidate(KeyCandidates &candidates, std::string_view game_id) {
+void AddCandidate(KeyCandidates &candidates, std::string_view game_id) {
   for (const std::string &known : candidates.game_ids)
-    if (KeyPart(known) == KeyPart(game_id)) return false;
+    if (KeyPart(known) == KeyPart(game_id)) return;
   candidates.game_ids.emplace_back(game_id);
-  return true;
 }
 
 LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::string_view line, LineBuffers &buffers,

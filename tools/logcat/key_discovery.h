@@ -33,8 +33,7 @@ struct KeyCandidates {
 };
 
 // Adds `game_id` unless a candidate with the same key is there already.
-// True when it was added.
-bool AddCandidate(KeyCandidates &candidates, std::string_view game_id);
+void AddCandidate(KeyCandidates &candidates, std::string_view game_id);
 
 // Reads one line with the first candidate whose key decrypts it with valid
 // padding and gives a record; `candidates.winner` then names that candidate.
