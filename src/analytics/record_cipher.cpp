@@ -4,13 +4,11 @@
 
 #include <atomic>
 #include <cstring>
-#include <mutex>
 
 namespace orvane {
 namespace {
 
 KeyBlock g_key_block;
-std::once_flag g_key_taken;
 std::atomic<bool> g_key_ready{false};
 
 } // namespace
@@ -20,11 +18,15 @@ const KeyBlock &GetKeyBlock() { return g_key_block; }
 void TakeKeyText(const char *game_id) {
   // Every event passes here; after the first, one load decides.
   if (g_key_ready.load(std::memory_order_acquire)) return;
-  std::call_once(g_key_taken, [game_id] {
+  // The first caller runs it while the others wait, as with std::call_once,
+  // whose pthread_once has glibc 2.34's version, which older systems refuse.
+  static const bool taken = [game_id] {
     g_key_block.keyText = MakeKeyText(game_id ? std::string_view(game_id) : std::string_view());
     g_key_block.keyTextTaken = &g_key_block;
     g_key_ready.store(true, std::memory_order_release);
-  });
+    return true;
+  }();
+  (void)taken;
 }
 
 RecordCipher::~RecordCipher() {

@@ -21,16 +21,16 @@ struct Session;
 
 struct Backend {
   const char *name; // "openssl", "cng": what the build chose, for reports
-  // Null on failure, after printing the reason to standard error.
+  // Null on failure. No backend prints anything: a failure reaches the game
+  // through the recorder's message to the host callback.
   Session *(*open)(const std::uint8_t *key, const std::uint8_t *iv);
   void (*close)(Session *session);
   // Encrypts `size` bytes into `out` (room for CiphertextSize(size) bytes).
-  // Returns the bytes written, or -1 after printing the reason to standard
-  // error.
+  // Returns the bytes written, or -1.
   std::ptrdiff_t (*encrypt)(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out);
   // Decrypts whole blocks into `out` (room for `size` + 16 bytes) and strips the
   // padding. Returns the plaintext size, or -1 for a wrong length or bad
-  // padding; prints nothing, since a damaged line is the reader's business.
+  // padding.
   std::ptrdiff_t (*decrypt)(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out);
 };
 

@@ -11,7 +11,6 @@
 #include <bcrypt.h>
 
 #include <climits>
-#include <cstdio>
 #include <cstring>
 
 namespace orvane::cipher {
@@ -28,13 +27,7 @@ struct Session {
 
 namespace {
 
-bool Succeeded(NTSTATUS status, const char *call) {
-  if (BCRYPT_SUCCESS(status)) return true;
-  if (call != nullptr)
-    std::fprintf(stderr, "OrvaneSDK: %s failed with NTSTATUS 0x%08lx\n", call,
-                 static_cast<unsigned long>(status));
-  return false;
-}
+bool Succeeded(NTSTATUS status) { return BCRYPT_SUCCESS(status); }
 
 void CloseCng(Session *session) {
   if (session == nullptr) return;
@@ -50,14 +43,11 @@ Session *OpenCng(const std::uint8_t *key, const std::uint8_t *iv) {
   std::memcpy(session->iv, iv, kIvSize);
   static const wchar_t kCbc[] = BCRYPT_CHAIN_MODE_CBC;
   const bool ok =
-      Succeeded(::BCryptOpenAlgorithmProvider(&session->algorithm, BCRYPT_AES_ALGORITHM, nullptr, 0),
-                "BCryptOpenAlgorithmProvider") &&
+      Succeeded(::BCryptOpenAlgorithmProvider(&session->algorithm, BCRYPT_AES_ALGORITHM, nullptr, 0)) &&
       Succeeded(::BCryptSetProperty(session->algorithm, BCRYPT_CHAINING_MODE,
-                                    reinterpret_cast<PUCHAR>(const_cast<wchar_t *>(kCbc)), sizeof kCbc, 0),
-                "BCryptSetProperty(ChainingModeCBC)") &&
+                                    reinterpret_cast<PUCHAR>(const_cast<wchar_t *>(kCbc)), sizeof kCbc, 0)) &&
       Succeeded(::BCryptGenerateSymmetricKey(session->algorithm, &session->key, nullptr, 0,
-                                             const_cast<PUCHAR>(key), kKeySize, 0),
-                "BCryptGenerateSymmetricKey");
+                                             const_cast<PUCHAR>(key), kKeySize, 0));
   if (!ok) {
     CloseCng(session);
     return nullptr;
@@ -66,10 +56,7 @@ Session *OpenCng(const std::uint8_t *key, const std::uint8_t *iv) {
 }
 
 std::ptrdiff_t EncryptCng(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
-  if (size > static_cast<std::size_t>(LONG_MAX) - 2 * kBlockSize) {
-    std::fprintf(stderr, "OrvaneSDK: BCryptEncrypt refused: record of %zu bytes\n", size);
-    return -1;
-  }
+  if (size > static_cast<std::size_t>(LONG_MAX) - 2 * kBlockSize) return -1;
   // CNG leaves the last ciphertext block in the IV buffer; a copy keeps every
   // record starting from the same IV.
   std::uint8_t iv[kIvSize];
@@ -79,8 +66,7 @@ std::ptrdiff_t EncryptCng(Session *session, const std::uint8_t *in, std::size_t 
   ULONG written = 0;
   if (!Succeeded(::BCryptEncrypt(session->key, const_cast<PUCHAR>(size ? in : &nothing),
                                  static_cast<ULONG>(size), nullptr, iv, kIvSize, out, room, &written,
-                                 BCRYPT_BLOCK_PADDING),
-                 "BCryptEncrypt"))
+                                 BCRYPT_BLOCK_PADDING)))
     return -1;
   return static_cast<std::ptrdiff_t>(written);
 }
@@ -90,11 +76,9 @@ std::ptrdiff_t DecryptCng(Session *session, const std::uint8_t *in, std::size_t 
   std::uint8_t iv[kIvSize];
   std::memcpy(iv, session->iv, kIvSize);
   ULONG written = 0;
-  // A damaged line (bad padding) is the reader's business: nothing printed.
   if (!Succeeded(::BCryptDecrypt(session->key, const_cast<PUCHAR>(in), static_cast<ULONG>(size), nullptr, iv,
                                  kIvSize, out, static_cast<ULONG>(size + kBlockSize), &written,
-                                 BCRYPT_BLOCK_PADDING),
-                 nullptr))
+                                 BCRYPT_BLOCK_PADDING)))
     return -1;
   return static_cast<std::ptrdiff_t>(written);
 }

@@ -1,16 +1,15 @@
-// Record cipher on OpenSSL's libcrypto (EVP interface).
+// Record cipher on OpenSSL's libcrypto (EVP interface), the system's own
+// copy found at the first record (cipher/libcrypto.h). Failures are returned,
+// never printed: the host callback is the library's only voice.
 #include "cipher/cipher.h"
+#include "cipher/libcrypto.h"
 
-#include <openssl/crypto.h>
-#include <openssl/err.h>
-#include <openssl/evp.h>
-
-#include <cstdio>
 #include <cstring>
 
 namespace orvane::cipher {
 
 struct Session {
+  const LibCrypto *crypto = nullptr;
   EVP_CIPHER_CTX *encrypt = nullptr;
   EVP_CIPHER_CTX *decrypt = nullptr;
   std::uint8_t iv[kIvSize];
@@ -23,11 +22,12 @@ namespace {
 
 // The key schedule is computed once per session, and the cipher is fetched
 // once with it.
-EVP_CIPHER_CTX *NewContext(const std::uint8_t *key, const std::uint8_t *iv, int encrypt) {
-  EVP_CIPHER_CTX *ctx = EVP_CIPHER_CTX_new();
+EVP_CIPHER_CTX *NewContext(const LibCrypto &crypto, const std::uint8_t *key, const std::uint8_t *iv,
+                           int encrypt) {
+  EVP_CIPHER_CTX *ctx = crypto.ctx_new();
   if (ctx == nullptr) return nullptr;
-  if (EVP_CipherInit_ex(ctx, EVP_aes_256_cbc(), nullptr, key, iv, encrypt) != 1) {
-    EVP_CIPHER_CTX_free(ctx);
+  if (crypto.cipher_init(ctx, crypto.aes_256_cbc(), nullptr, key, iv, encrypt) != 1) {
+    crypto.ctx_free(ctx);
     return nullptr;
   }
   return ctx;
@@ -35,25 +35,24 @@ EVP_CIPHER_CTX *NewContext(const std::uint8_t *key, const std::uint8_t *iv, int 
 
 void CloseOpenSsl(Session *session) {
   if (session == nullptr) return;
-  EVP_CIPHER_CTX_free(session->encrypt);
-  EVP_CIPHER_CTX_free(session->decrypt);
+  session->crypto->ctx_free(session->encrypt);
+  session->crypto->ctx_free(session->decrypt);
   delete session;
 }
 
 Session *OpenOpenSsl(const std::uint8_t *key, const std::uint8_t *iv) {
-  // OpenSSL's own exit-time clean-up would free its state while a game's exit
-  // handlers or other threads may still record; the process's end frees it.
-  static const bool initialised = OPENSSL_init_crypto(OPENSSL_INIT_NO_ATEXIT, nullptr) == 1;
-  (void)initialised;
+  const LibCrypto *crypto = SystemLibCrypto();
+  if (crypto == nullptr) return nullptr; // neither OpenSSL 3 nor 1.1 on this system
   auto *session = new Session;
+  session->crypto = crypto;
   std::memcpy(session->iv, iv, kIvSize);
   std::memcpy(session->chain, iv, kIvSize);
-  session->encrypt = NewContext(key, iv, 1);
-  session->decrypt = NewContext(key, iv, 0);
+  session->encrypt = NewContext(*crypto, key, iv, 1);
+  session->decrypt = NewContext(*crypto, key, iv, 0);
   // Records are padded here and the encryption is never finished, so the
   // context only ever sees whole blocks and its own padding never applies.
   if (session->encrypt == nullptr || session->decrypt == nullptr) {
-    ERR_print_errors_fp(stderr);
+    crypto->clear_error();
     CloseOpenSsl(session);
     return nullptr;
   }
@@ -75,11 +74,12 @@ std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
   std::memset(out + size, static_cast<int>(total - size), total - size);
   for (std::size_t i = 0; i < kBlockSize; ++i) out[i] ^= session->iv[i] ^ session->chain[i];
   int written = 0;
-  if (EVP_EncryptUpdate(ctx, out, &written, out, static_cast<int>(total)) != 1 ||
+  const LibCrypto &crypto = *session->crypto;
+  if (crypto.encrypt_update(ctx, out, &written, out, static_cast<int>(total)) != 1 ||
       written != static_cast<int>(total)) {
-    ERR_print_errors_fp(stderr);
+    crypto.clear_error();
     // The stream's state is unknown now: it starts again from the IV.
-    EVP_EncryptInit_ex(ctx, nullptr, nullptr, nullptr, session->iv);
+    crypto.encrypt_init(ctx, nullptr, nullptr, nullptr, session->iv);
     std::memcpy(session->chain, session->iv, kIvSize);
     return -1;
   }
@@ -93,11 +93,12 @@ std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
   if (size > static_cast<std::size_t>(INT32_MAX / 2)) return -1;
   // The final call refuses empty input, a partial block and bad padding, and
   // nothing is written past `size`: OpenSSL holds back the last block until then.
-  bool ok = EVP_DecryptInit_ex(ctx, nullptr, nullptr, nullptr, session->iv) == 1 &&
-            EVP_DecryptUpdate(ctx, out, &first, in, static_cast<int>(size)) == 1 &&
-            EVP_DecryptFinal_ex(ctx, out + first, &second) == 1;
+  const LibCrypto &crypto = *session->crypto;
+  bool ok = crypto.decrypt_init(ctx, nullptr, nullptr, nullptr, session->iv) == 1 &&
+            crypto.decrypt_update(ctx, out, &first, in, static_cast<int>(size)) == 1 &&
+            crypto.decrypt_final(ctx, out + first, &second) == 1;
   if (!ok) {
-    ERR_clear_error();
+    crypto.clear_error();
     return -1;
   }
   return first + second;

@@ -11,15 +11,25 @@
 #include <string_view>
 #include <sys/file.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <thread>
 #include <unistd.h>
 
 namespace orvane::platform {
 namespace {
 
+// stat and fstat as the system calls themselves: glibc's functions of those
+// names have glibc 2.33's version, which older systems refuse to load. On
+// 64-bit Linux the kernel fills the very struct stat of <sys/stat.h>.
+static_assert(sizeof(long) == 8, "the kernel's struct stat is glibc's on 64-bit Linux only");
+int StatPath(const char *path, struct stat &st) {
+  return static_cast<int>(::syscall(SYS_newfstatat, AT_FDCWD, path, &st, 0));
+}
+int StatOpenFile(int fd, struct stat &st) { return static_cast<int>(::syscall(SYS_fstat, fd, &st)); }
+
 bool DirectoryExistsPosix(const char *path) {
   struct stat st;
-  return ::stat(path, &st) == 0 && S_ISDIR(st.st_mode);
+  return StatPath(path, st) == 0 && S_ISDIR(st.st_mode);
 }
 
 // Owner-only whatever the umask: another local user must not be able to
@@ -48,7 +58,7 @@ FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
   } while (fd < 0 && errno == EINTR);
   if (fd < 0) return kNoFile;
   struct stat st;
-  if (::fstat(fd, &st) != 0) {
+  if (StatOpenFile(fd, st) != 0) {
     size = -1;
   } else if (!S_ISREG(st.st_mode)) {
     ::close(fd);
@@ -61,7 +71,7 @@ FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
 
 std::int64_t FileSizePosix(FileHandle file) {
   struct stat st;
-  if (::fstat(static_cast<int>(file), &st) != 0) return -1;
+  if (StatOpenFile(static_cast<int>(file), st) != 0) return -1;
   return st.st_size;
 }
 
