@@ -21,6 +21,11 @@ fail() {
   exit 1
 }
 
+# One run at a time per root; a /proc left mounted by a killed run goes first.
+exec 9>"$root.lock"
+flock 9
+umount "$root/proc" 2>/dev/null || true
+
 if [ "$(cat "$stamp" 2>/dev/null)" != "$packages" ]; then
   echo "Making the Debian 11 root in $root (once per machine)"
   started=$SECONDS

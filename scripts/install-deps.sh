@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
 # Installs the Debian packages that building and testing need, when missing.
 # Usage: scripts/install-deps.sh [linux|all]
-#   all adds mingw-w64, wine, clang, and for the release archives and their
-#   consumer builds llvm (llvm-dlltool), lld (lld-link) and gdb.
+#   all adds mingw-w64, wine, clang, debootstrap (the Debian 11 leg), and for
+#   the release archives and their consumer builds llvm (llvm-dlltool), lld
+#   (lld-link) and gdb.
 set -euo pipefail
 
 # mono-mcs and mono-runtime compile and run the C# binding's tests; python3
@@ -11,7 +12,8 @@ packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googl
   mono-mcs mono-runtime python3)
 if [ "${1:-all}" = all ]; then
   # wine answers the DLL's CNG calls with GnuTLS, a recommendation only.
-  packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30 llvm lld gdb)
+  packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30 llvm lld gdb
+    debootstrap)
 fi
 
 missing=()

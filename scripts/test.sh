@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
 # The whole test run, as CI does it: the Linux build with warnings as errors,
-# its tests plain, under AddressSanitizer + UBSan and under ThreadSanitizer,
-# the Windows DLL under wine, the release archives with game builds against
-# them, then each fuzzer for a bounded time.
+# its tests plain, its library loaded on Debian 11 (glibc 2.31, OpenSSL 1.1),
+# the tests under AddressSanitizer + UBSan and under ThreadSanitizer, the
+# Windows DLL under wine, the release archives with game builds against them,
+# then each fuzzer for a bounded time.
 #   scripts/test.sh            everything
 #   scripts/test.sh quick      the Linux build and its tests only
 #   scripts/test.sh package    the release archives and the game builds only
@@ -33,6 +34,9 @@ step "Linux tests"
 ctest --preset ci -j "$jobs"
 
 [ "$mode" = quick ] && exit 0
+
+step "Debian 11: the library above on glibc 2.31 with OpenSSL 1.1 (scripts/debian11-leg.sh)"
+scripts/debian11-leg.sh build/ci
 
 step "AddressSanitizer + UndefinedBehaviorSanitizer"
 cmake --preset asan -DORVANE_WARNINGS_AS_ERRORS=ON >/dev/null

@@ -22,6 +22,6 @@ foreach(file IN LISTS FILES)
   endforeach()
 endforeach()
 if(problems)
-  message(FATAL_ERROR "newer than glibc ${newest_GLIBC} / GLIBCXX_${newest_GLIBCXX} / CXXABI_${newest_CXXABI} "
-                      "allow, or a libcrypto named:${problems}")
+  message(FATAL_ERROR "newer than GLIBC_${newest_GLIBC}, GLIBCXX_${newest_GLIBCXX} or "
+                      "CXXABI_${newest_CXXABI}, or a libcrypto named:${problems}")
 endif()
