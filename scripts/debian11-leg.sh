@@ -7,7 +7,8 @@
 # $ORVANE_BULLSEYE_ROOT (default /var/cache/orvane-bullseye-root) for later runs.
 # Inside it the sample host (examples/host.c) is compiled and runs INIT and
 # ENTER against BUILD_DIR's libOrvaneSDK.so with a launcher's command line;
-# orvane-logcat of BUILD_DIR must read the log back, outside the root and in it.
+# orvane-logcat of BUILD_DIR must read the log back, outside the root and in
+# it. Then the same without any libcrypto.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 build="$(realpath "${1:-build/ci}")"
@@ -83,4 +84,16 @@ for reader in outside inside; do
     fail "orvane-logcat ($reader) does not read INIT and ENTER back:"$'\n'"$records"
 done
 echo "$records"
-echo "Debian 11 ($glibc, libcrypto.so.1.1 only): the library loads, records and is read back"
+
+# Neither OpenSSL (libcrypto.so.1.1 hidden in a mount namespace of its own):
+# the library still loads and answers, and each event fails with its message.
+out="$(unshare -m bash -c 'mount --bind /dev/null "$1/usr/lib/x86_64-linux-gnu/libcrypto.so.1.1" &&
+  exec chroot "$1" /usr/bin/env -i PATH=/usr/bin:/bin XDG_DATA_HOME="$2/data" "$2/host" \
+    --library "$2/lib/libOrvaneSDK.so" enter "$3" "$4" uuid -- --userUuid--"$4"' _ "$root" "$work" "$game" "$user")" &&
+  fail "an event succeeded without libcrypto:"$'\n'"$out"
+for expected in "  [2 ERROR] [OrvaneSDK] Analytics ENTER - failed. Record encryption failed." \
+  "oAnalyticsGameEnter() = -1" "oAuthGetUserUuid() = \"$user\""; do
+  grep -qxF "$expected" <<<"$out" || fail "without libcrypto, the host did not print: $expected"$'\n'"$out"
+done
+echo "Debian 11 ($glibc, libcrypto.so.1.1 only): the library loads, records and is read back;"
+echo "without libcrypto it loads and its events fail with their message"

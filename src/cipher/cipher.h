@@ -20,7 +20,8 @@ constexpr std::size_t CiphertextSize(std::size_t size) { return (size / kBlockSi
 struct Session;
 
 struct Backend {
-  const char *name; // "openssl", "cng": what the build chose, for reports
+  const char *name;  // "openssl", "cng": what the build chose, for reports
+  const char *needs; // what it needs of the system, for a reader's failure report
   // Null on failure. No backend prints anything: a failure reaches the game
   // through the recorder's message to the host callback.
   Session *(*open)(const std::uint8_t *key, const std::uint8_t *iv);

@@ -83,7 +83,7 @@ std::ptrdiff_t DecryptCng(Session *session, const std::uint8_t *in, std::size_t 
   return static_cast<std::ptrdiff_t>(written);
 }
 
-const Backend kCng = {"cng", OpenCng, CloseCng, EncryptCng, DecryptCng};
+const Backend kCng = {"cng", "bcrypt.dll with AES-CBC", OpenCng, CloseCng, EncryptCng, DecryptCng};
 Backend g_backend = kCng;
 
 } // namespace

@@ -18,7 +18,7 @@ namespace orvane::logcat {
 // Owns the cipher session of every key it holds, closed with the pool.
 struct KeyPool {
   std::map<std::string, LogKey, std::less<>> keys; // by the bytes of the id that make the key
-  bool failed = false; // a session could not be opened (the reason went to standard error)
+  bool failed = false;                             // a session could not be opened
 
   KeyPool() = default;
   KeyPool(const KeyPool &) = delete;

@@ -33,7 +33,7 @@ struct LogKey {
   cipher::Session *session = nullptr;
 };
 
-// Null session when the backend failed (its reason went to standard error).
+// Null session when the backend failed.
 LogKey OpenLogKey(std::string_view key_game_id);
 void CloseLogKey(LogKey &key);
 

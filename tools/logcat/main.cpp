@@ -7,6 +7,7 @@
 #include "standard_input.h"
 #include "valid_utf8.h"
 
+#include "cipher/cipher.h"
 #include "logformat/record_text.h"
 
 #include <cerrno>
@@ -323,7 +324,8 @@ int Run(int argc, char **argv) {
   }
   // The files are read only: the process's end closes them.
   if (reader.pool.failed) {
-    Complain("the cipher could not be prepared for some key");
+    Complain(std::string("the cipher could not be prepared for some key; it needs ") +
+             cipher::backend().needs);
     Raise(reader, 2);
   }
   std::fflush(stdout);
