@@ -104,9 +104,8 @@ std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
   return first + second;
 }
 
-const Backend kOpenSsl = {"openssl",      "OpenSSL's libcrypto.so.3 or libcrypto.so.1.1",
-                          OpenOpenSsl,    CloseOpenSsl,
-                          EncryptOpenSsl, DecryptOpenSsl};
+constexpr char kNeeds[] = "OpenSSL's libcrypto.so.3 or libcrypto.so.1.1";
+const Backend kOpenSsl = {"openssl", kNeeds, OpenOpenSsl, CloseOpenSsl, EncryptOpenSsl, DecryptOpenSsl};
 Backend g_backend = kOpenSsl;
 
 } // namespace
