@@ -38,8 +38,8 @@ static class BindingTest {
               "initialized. Initializing the SDK.|IInitialize() - OK.|WAnalytics ENTER - log was never initialized. " +
               "Initialized the game log|IAnalytics INIT - OK|IAnalytics ENTER - OK|WAnalytics INIT - log had been " +
               "already initialized.|IAnalytics SPECIAL - OK|IAnalytics EXIT - OK|EAnalytics ENTER - failed. Game id " +
-              "is empty|EAnalytics SPECIAL - failed. Text holds a NUL character.|EAnalytics EXIT - failed. Text holds " +
-              "a NUL character.|IInitialize() - OK.", string.Join("|", heard), "messages, level letter first");
+              "is empty|EAnalytics SPECIAL - failed. Text holds a NUL character.|EAnalytics EXIT - failed. " +
+              "Text holds a NUL character.|IInitialize() - OK.", string.Join("|", heard), "messages, level first");
         var run = new ProcessStartInfo(logcat, data + "/Orvane/Logs/demo42.log") {UseShellExecute = false,
             RedirectStandardOutput = true, StandardOutputEncoding = System.Text.Encoding.UTF8};
         Process reader = Process.Start(run);
