@@ -37,15 +37,18 @@ session='"type":"INIT""type":"ENTER""type":"SPECIAL"' next='"type":"ENTER""type"
   fail "the Linux games' log holds $(types data/Orvane/Logs/space-race.log)"
 [ "$(types "$WINEPREFIX/drive_c/Orvane/Logs/space-race.log")" = "$session" ] || fail "the Windows game's log"
 [ "$(grep -c ' 3f6c2a9e-41d7-4b8e-9a0c-5d1e7f2b8c44 level=3$' read-logs.log)" = 3 ] || fail "read-logs.sh"
-for path in $(grep -o 'OrvaneSDK-[^ ]*' msvc.bat | tr '\\' /); do [ -e "$path" ] || fail "msvc.bat: no $path"; done
+grep -o 'OrvaneSDK-[^ ]*' msvc.bat | while read -r path; do
+  [ -e "${path//\\//}" ] || fail "msvc.bat: no $path"
+done
 version=$(PKG_CONFIG_PATH=$linux/lib/pkgconfig pkg-config --modversion orvanesdk)
 while read -r manifest; do # the archive's own binding and library, in the package it names
   case $manifest in
   *windows*) binding=$windows/bindings/csharp/OrvaneSDK.cs library=$windows/bin/OrvaneSDK.dll ;;
-  *) binding=$linux/share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs library=$linux/lib/libOrvaneSDK.so.$version ;;
+  *) binding=$linux/share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs \
+    library=$linux/lib/libOrvaneSDK.so.$version ;;
   esac
-  run unity cmake -DPACKAGE="$PWD/$(dirname "$manifest")" -DBINDING="$binding" -DLIBRARY="$library" -DVERSION="$version" \
-    -P "$here/../check_unity_package.cmake"
+  run unity cmake -DPACKAGE="$PWD/$(dirname "$manifest")" -DBINDING="$binding" -DLIBRARY="$library" \
+    -DVERSION="$version" -P "$here/../check_unity_package.cmake"
 done <unity-packages.txt
 
 # kernel32 and msvcrt come from mingw-w64's import libraries, which lld-link reads too.
@@ -55,15 +58,18 @@ run d lld-link /nologo /entry:start /subsystem:console /nodefaultlib /out:d/cons
   "$windows/lib/OrvaneSDK.lib" /usr/x86_64-w64-mingw32/lib/lib{kernel32,msvcrt}.a
 cp "$windows/bin/OrvaneSDK.dll" d/
 rm -rf "$WINEPREFIX/drive_c/Orvane" && run d bash "$here/../windows/wine_run.sh" "$WINEPREFIX" d/consumer.exe
-[ "$(types "$WINEPREFIX/drive_c/Orvane/Logs/consumer.log")" = '"type":"INIT""type":"ENTER"' ] || fail "d's log"
+[ "$(types "$WINEPREFIX/drive_c/Orvane/Logs/consumer.log")" = '"type":"INIT""type":"ENTER"' ] ||
+  fail "d's log"
 
 [ "$(stat -c %s "$windows/bin/OrvaneSDK.dll")" -lt 400000 ] || fail "OrvaneSDK.dll is not stripped"
 ! grep -rlaF "$root" "$linux" "$windows" || fail "these files name the folder the release was built in"
 for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
   gdb -batch -ex "set substitute-path /usr/src/orvanesdk-$version $root" -ex 'list oAnalyticsGameEnter' \
     -ex 'info line orvane::RecordEvent' "$library" >gdb.log 2>&1 || true
-  grep -q 'oAnalyticsGameEnter(const char \*gameId' gdb.log &&
-    grep -q "of \"/usr/src/orvanesdk-$version/src/analytics/event_recorder.cpp\"" gdb.log ||
-    { cat gdb.log; fail "gdb lists no sources of ours for $library"; }
+  if ! grep -q 'oAnalyticsGameEnter(const char \*gameId' gdb.log ||
+    ! grep -q "of \"/usr/src/orvanesdk-$version/src/analytics/event_recorder.cpp\"" gdb.log; then
+    cat gdb.log
+    fail "gdb lists no sources of ours for $library"
+  fi
 done
 echo "package: every recipe ran; the games recorded after the SDK folders were moved away"
