@@ -5,7 +5,7 @@
 # ordinary toolchain file, pkg-config, C# under mono); then the SDK folders are moved away and run.sh
 # starts every game (the Windows one under wine), read-logs.sh reads what they recorded. Beside the
 # recipes: an MSVC-ABI game (clang + lld-link, OrvaneSDK.lib) under wine, the Unity package of each
-# archive, stripped binaries, and symbols that name no folder of the build machine yet let gdb list our
+# archive, no build templates, stripped binaries, and symbols that name no folder of the build machine yet let gdb list our
 # sources.  consumers.sh PACKAGES WORK
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd) root=$(cd "$(dirname "$0")/../.." && pwd)
@@ -62,6 +62,7 @@ rm -rf "$WINEPREFIX/drive_c/Orvane" && run d bash "$here/../windows/wine_run.sh"
   fail "d's log"
 
 [ "$(stat -c %s "$windows/bin/OrvaneSDK.dll")" -lt 400000 ] || fail "OrvaneSDK.dll is not stripped"
+[ -z "$(find "$linux" "$windows" -name CMakeLists.txt -o -name '*.in')" ] || fail "build templates shipped"
 ! grep -rlaF "$root" "$linux" "$windows" || fail "these files name the folder the release was built in"
 for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
   gdb -batch -ex "set substitute-path /usr/src/orvanesdk-$version $root" -ex 'list oAnalyticsGameEnter' \
