@@ -5,8 +5,8 @@
 # ordinary toolchain file, pkg-config, C# under mono); then the SDK folders are moved away and run.sh
 # starts every game (the Windows one under wine), read-logs.sh reads what they recorded. Beside the
 # recipes: an MSVC-ABI game (clang + lld-link, OrvaneSDK.lib) under wine, the Unity package of each
-# archive, no build templates, stripped binaries, and symbols that name no folder of the build machine yet let gdb list our
-# sources.  consumers.sh PACKAGES WORK
+# archive, no build templates, stripped binaries, and symbols that name no folder of the build machine
+# yet let gdb list our sources.  consumers.sh PACKAGES WORK
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd) root=$(cd "$(dirname "$0")/../.." && pwd)
 packages=$(cd "$1" && pwd) # WORK/wineprefix is kept between runs
