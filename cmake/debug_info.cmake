@@ -17,6 +17,16 @@ if(ORVANE_SEPARATE_DEBUG_INFO AND NOT MSVC AND CMAKE_BUILD_TYPE MATCHES "^(Relea
   endif()
   set(ORVANE_SPLIT_DEBUG_INFO ON)
   target_compile_options(orvane_debug_info INTERFACE -g)
+  # The debug information names our files under one fixed folder, whatever
+  # folder this build ran in: releases do not depend on the build machine,
+  # and a debugger is pointed at the sources with one rule (README, "Debug
+  # information"). The build folder is mapped last, so that it wins where it
+  # lies inside the source folder; its generated headers then sit beside the
+  # installed ones.
+  set(ORVANE_SOURCE_PREFIX /usr/src/orvanesdk-${PROJECT_VERSION})
+  target_compile_options(orvane_debug_info INTERFACE
+    $<$<COMPILE_LANGUAGE:C,CXX>:-ffile-prefix-map=${PROJECT_SOURCE_DIR}=${ORVANE_SOURCE_PREFIX}>
+    $<$<COMPILE_LANGUAGE:C,CXX>:-ffile-prefix-map=${PROJECT_BINARY_DIR}=${ORVANE_SOURCE_PREFIX}>)
 endif()
 
 # Splits TARGET's debug information into $<TARGET_FILE>.debug and installs that

@@ -4,15 +4,20 @@
 # `symbols`: the .debug files (cmake/debug_info.cmake), beside the binaries
 # they belong to, kept out of the sdk archive.
 #
-#   Windows (ZIP)                          Linux (TGZ)
-#   bin/OrvaneSDK.dll                      lib/libOrvaneSDK.so.1.0.0, .so.1, .so
-#   bin/orvane-logcat.exe                  bin/orvane-logcat
-#   lib/OrvaneSDK.lib, OrvaneSDK.def       lib/pkgconfig/orvanesdk.pc
-#   lib/libOrvaneSDK.dll.a                 lib/cmake/OrvaneSDK/
-#   lib/pkgconfig/orvanesdk.pc             include/OrvaneSDK.h, OrvaneSDKVersion.h
-#   lib/cmake/OrvaneSDK/                   share/doc/OrvaneSDK/LICENSE, CHANGELOG.md, README.md
-#   include/OrvaneSDK.h, OrvaneSDKVersion.h
-#   LICENSE, CHANGELOG.md, README.md, bindings/csharp/
+#   Windows (ZIP)                             Linux (TGZ)
+#   bin/OrvaneSDK.dll                         lib/libOrvaneSDK.so.1.0.0, .so.1, .so
+#   bin/orvane-logcat.exe                     bin/orvane-logcat
+#   lib/OrvaneSDK.lib, OrvaneSDK.def          lib/pkgconfig/orvanesdk.pc
+#   lib/libOrvaneSDK.dll.a                    lib/cmake/OrvaneSDK/
+#   lib/pkgconfig/orvanesdk.pc                include/OrvaneSDK.h, OrvaneSDKVersion.h
+#   lib/cmake/OrvaneSDK/                      share/doc/OrvaneSDK/LICENSE, CHANGELOG.md, README.md
+#   include/OrvaneSDK.h, OrvaneSDKVersion.h   share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs
+#   LICENSE, CHANGELOG.md, README.md          share/OrvaneSDK/unity/com.orvane.sdk/
+#   bindings/csharp/OrvaneSDK.cs
+#   unity/com.orvane.sdk/
+# The binding ships as its one source file and the Unity package as built
+# (bindings/csharp/CMakeLists.txt), with this platform's library in its
+# Plugins/x86_64/; the templates they are made from stay in the repository.
 include(CMakePackageConfigHelpers)
 set(cmake_dir ${CMAKE_INSTALL_LIBDIR}/cmake/OrvaneSDK)
 
@@ -43,15 +48,14 @@ install(FILES ${PROJECT_BINARY_DIR}/orvanesdk.pc
 # Documents at the top of a Windows archive, in share/doc on Linux.
 if(WIN32)
   set(doc_dir .)
-  set(binding_dir bindings)
+  set(share_dir .)
 else()
   set(doc_dir ${CMAKE_INSTALL_DOCDIR})
-  set(binding_dir ${CMAKE_INSTALL_DATADIR}/OrvaneSDK/bindings)
+  set(share_dir ${CMAKE_INSTALL_DATADIR}/OrvaneSDK)
 endif()
 install(FILES LICENSE CHANGELOG.md README.md DESTINATION ${doc_dir} COMPONENT sdk)
-if(EXISTS ${PROJECT_SOURCE_DIR}/bindings/csharp)
-  install(DIRECTORY bindings/csharp DESTINATION ${binding_dir} COMPONENT sdk)
-endif()
+install(FILES bindings/csharp/OrvaneSDK.cs DESTINATION ${share_dir}/bindings/csharp COMPONENT sdk)
+install(DIRECTORY ${ORVANE_UNITY_PACKAGE} DESTINATION ${share_dir}/unity COMPONENT sdk)
 
 # Release archives: one with the sdk component, one with the symbols.
 if(PROJECT_IS_TOP_LEVEL)

@@ -134,7 +134,10 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  *   ERROR   "log file failed to open. Maybe a bad game_id (<id>)?"
  *                                                  result -1; also for a game
  *                                                  id that is not a plain file
- *                                                  name (see below)
+ *                                                  name (see below); an id
+ *                                                  over 256 bytes shows its
+ *                                                  first 256 and "...", and
+ *                                                  control bytes as \xNN
  *   ERROR   "log file failed to write."            result -1 (disk full, I/O); a
  *                                                  first line that did not go
  *                                                  in whole is cut away (on a

@@ -3,7 +3,7 @@
 # Usage: scripts/install-deps.sh [linux|all]
 #   all adds mingw-w64, wine, clang, debootstrap (the Debian 11 leg), and for
 #   the release archives and their consumer builds llvm (llvm-dlltool), lld
-#   (lld-link) and gdb.
+#   (lld-link), gdb and jq.
 set -euo pipefail
 
 # mono-mcs and mono-runtime compile and run the C# binding's tests; python3
@@ -11,8 +11,9 @@ set -euo pipefail
 packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind
   mono-mcs mono-runtime python3)
 if [ "${1:-all}" = all ]; then
-  # wine answers the DLL's CNG calls with GnuTLS, a recommendation only.
-  packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30 llvm lld gdb
+  # wine answers the DLL's CNG calls with GnuTLS, a recommendation only; jq
+  # runs in the README's log-reading recipe, which the package leg runs.
+  packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30 llvm lld gdb jq
     debootstrap)
 fi
 

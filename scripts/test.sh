@@ -19,7 +19,7 @@ if [ "$mode" = quick ]; then scripts/install-deps.sh linux; else scripts/install
 package_leg() {
   step "Release archives (scripts/release.sh)"
   scripts/release.sh
-  step "Package: games built against the archives (find_package, pkg-config, mingw, MSVC ABI)"
+  step "Package: the README's adoption recipes against the archives (CMake, pkg-config, mingw, C#, MSVC ABI)"
   bash tests/package/consumers.sh build/release build/package
 }
 if [ "$mode" = package ]; then

@@ -24,6 +24,11 @@ std::string Rec(const std::string &type, const std::string &extra = "") {
 Message A(int level, const std::string &type, const std::string &text) {
   return {level, "[OrvaneSDK] Analytics " + type + " - " + text};
 }
+std::string Repeat(const std::string &text, int times) {
+  std::string out;
+  while (times-- > 0) out += text;
+  return out;
+}
 const Message kNeverInitialized = A(1, "ENTER", "log was never initialized. Initialized the game log");
 const std::string kTorn = "(undecryptable)";
 
@@ -73,7 +78,10 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
   // clang-format off
   const std::pair<std::string, std::string> hostile[] = { // which ids are refused is the game-id rule's test
       {"../x", "../x"}, {"CON", "CON"}, {"t\tb\x7f", "t\\x09b\\x7f"},
-      {"x\n[OrvaneSDK] y - OK\x1b[2K", "x\\x0a[OrvaneSDK] y - OK\\x1b[2K"}};
+      {"x\n[OrvaneSDK] y - OK\x1b[2K", "x\\x0a[OrvaneSDK] y - OK\\x1b[2K"},
+      // An id is shown up to its first 256 bytes, counted before escaping.
+      {std::string(256, 'a'), std::string(256, 'a')}, {std::string(257, 'a'), std::string(256, 'a') + "..."},
+      {std::string(1 << 20, '\x01'), Repeat("\\x01", 256) + "..."}};
   // clang-format on
   for (const auto &[id, shown] : hostile) {
     Captured().clear();

@@ -9,6 +9,25 @@
 // Every call may come from any thread. Texts cross as UTF-8 both ways; a null
 // text stays null (the library reads it as empty). Messages reach the
 // handler on the thread of the call that caused them, before it returns.
+//
+// A text holding a NUL character ('\0') would end there for the library,
+// which would store it cut: an analytics wrapper refuses it whole instead,
+// returns -1 and the handler hears (Error,
+// "[OrvaneSDK] Analytics <TYPE> - failed. Text holds a NUL character.").
+//
+// No wrapper throws an exception of its own. Two can still escape any of
+// them, from the runtime's loader, on the first call that needs the library:
+//   DllNotFoundException        the native library was not found or did not
+//                               load (on Linux also when libssl3 is missing);
+//   EntryPointNotFoundException the library lacks an export (one older than
+//                               this binding).
+// Where the library is looked for: mono and .NET first in the folder of the
+// program's assembly (libOrvaneSDK.so on Linux, OrvaneSDK.dll on Windows),
+// then where the system loader looks (LD_LIBRARY_PATH and the ld.so cache on
+// Linux; the PATH search of LoadLibrary on Windows). Unity: in the Editor,
+// the plugin folder of the package or of Assets (Plugins/x86_64/) with the
+// import settings of the README; in a player, <Game>_Data/Plugins/x86_64/,
+// where the build puts it.
 using System;
 using System.Runtime.InteropServices;
 using System.Text;
@@ -21,7 +40,8 @@ namespace Orvane
 
     /// <summary>
     /// The analytics event log, the launch identity and the library's messages. Every call may come
-    /// from any thread; none throws.
+    /// from any thread. None throws, except DllNotFoundException and EntryPointNotFoundException from the
+    /// runtime's loader when the native library or an export is missing (see the top of this file).
     /// </summary>
     public static class OrvaneSDK
     {
@@ -88,30 +108,39 @@ namespace Orvane
         public static void Initialize() { Native.oInitialize(); }
 
         /// <summary>Starts the game's log with its INIT record, unless it has one.</summary>
-        /// <returns>0 when done, -1 when refused or not written (the messages say why).</returns>
+        /// <returns>0 when done, -1 when refused or not written (the messages say why; a text holding a NUL
+        /// character is refused).</returns>
         public static int AnalyticsInit(string gameId, string userId)
         {
+            if (HoldsNul("INIT", gameId, userId)) return -1;
             return Native.oAnalyticsInit(ToUtf8(gameId), ToUtf8(userId));
         }
 
         /// <summary>Records that the user entered the game.</summary>
-        /// <returns>0 when written, -1 when refused or not written (the messages say why).</returns>
+        /// <returns>0 when written, -1 when refused or not written (the messages say why; a text holding a
+        /// NUL character is refused).</returns>
         public static int AnalyticsGameEnter(string gameId, string userId)
         {
+            if (HoldsNul("ENTER", gameId, userId)) return -1;
             return Native.oAnalyticsGameEnter(ToUtf8(gameId), ToUtf8(userId));
         }
 
         /// <summary>Records that the user left the game.</summary>
-        /// <returns>0 when written, -1 when refused or not written (the messages say why).</returns>
+        /// <returns>0 when written, -1 when refused or not written (the messages say why; a text holding a
+        /// NUL character is refused).</returns>
         public static int AnalyticsGameExit(string gameId, string userId)
         {
+            if (HoldsNul("EXIT", gameId, userId)) return -1;
             return Native.oAnalyticsGameExit(ToUtf8(gameId), ToUtf8(userId));
         }
 
-        /// <summary>Records a game-defined event; <paramref name="extra"/> is stored as given.</summary>
-        /// <returns>0 when written, -1 when refused or not written (the messages say why).</returns>
+        /// <summary>Records a game-defined event; <paramref name="extra"/> is stored as given; one
+        /// holding a NUL character is refused.</summary>
+        /// <returns>0 when written, -1 when refused or not written (the messages say why; a text holding a
+        /// NUL character is refused).</returns>
         public static int AnalyticsSpecial(string gameId, string userId, string extra)
         {
+            if (HoldsNul("SPECIAL", gameId, userId, extra)) return -1;
             return Native.oAnalyticsSpecial(ToUtf8(gameId), ToUtf8(userId), ToUtf8(extra));
         }
 
@@ -132,12 +161,18 @@ namespace Orvane
         [AOT.MonoPInvokeCallback(typeof(Native.LogCallback))]
         static void OnNativeLog(int level, IntPtr message)
         {
-            // An exception must not unwind into the library's frames: the
-            // call would never count as ended, and withdrawing would hang.
+            Deliver((LogLevel)level, message);
+        }
+
+        // Runs the handler on a message. An exception must not unwind into
+        // the library's frames: the call would never count as ended, and
+        // withdrawing would hang; so what the handler throws goes no further.
+        static void Deliver(LogLevel level, IntPtr native, string text = null)
+        {
             try
             {
                 Action<LogLevel, string> current = handler;
-                if (current != null) current((LogLevel)level, FromUtf8(message));
+                if (current != null) current(level, text ?? FromUtf8(native));
             }
             catch (Exception e)
             {
@@ -168,6 +203,19 @@ namespace Orvane
         static void Withdraw()
         {
             if (handler != null) RegisterForLogs(null);
+        }
+
+        // True, with the Error message sent, when a text holds a NUL character.
+        static bool HoldsNul(string type, params string[] texts)
+        {
+            foreach (string text in texts)
+            {
+                if (text == null || text.IndexOf('\0') < 0) continue;
+                Deliver(LogLevel.Error, IntPtr.Zero,
+                    "[OrvaneSDK] Analytics " + type + " - failed. Text holds a NUL character.");
+                return true;
+            }
+            return false;
         }
 
         static byte[] ToUtf8(string text)

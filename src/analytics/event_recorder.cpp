@@ -134,10 +134,16 @@ struct Event {
   std::string_view extra;
 };
 
+// Bytes of a game id that a message shows: hosts forward messages to their
+// consoles, so a huge id must not come back whole.
+constexpr std::size_t kShownGameIdBytes = 256;
+
 // The game id as a message may show it: control bytes would let a hostile id
-// forge lines in the host's own log, so they appear as \xNN.
+// forge lines in the host's own log, so they appear as \xNN; past its first
+// kShownGameIdBytes bytes it is cut and "..." marks the cut.
 void AppendPrintable(std::string &out, std::string_view text) {
-  for (const char c : text) {
+  const bool cut = text.size() > kShownGameIdBytes;
+  for (const char c : text.substr(0, kShownGameIdBytes)) {
     const auto byte = static_cast<std::uint8_t>(c);
     if (byte >= 0x20 && byte != 0x7f) {
       out += c;
@@ -146,6 +152,7 @@ void AppendPrintable(std::string &out, std::string_view text) {
       AppendHex(out, &byte, 1);
     }
   }
+  if (cut) out += "...";
 }
 
 // Opens the game's log. The directory is examined only when the open fails,

@@ -27,16 +27,19 @@ static class BindingTest {
         var heard = new List<string>();
         OrvaneSDK.RegisterForLogs((level, message) => heard.Add(level.ToString()[0] + message.Substring(12)));
         string user = OrvaneSDK.GetUserUuid(), game = OrvaneSDK.GetGameId(), extra = "caf\u00e9 \"\u2713\"";
-        Equal("a1b2c3d4 demo42 " + version + " 0 0 0 0 -1", string.Join(" ", user, game, OrvaneSDK.GetVersion(),
-            OrvaneSDK.AnalyticsGameEnter(game, user),
+        Equal("a1b2c3d4 demo42 " + version + " 0 0 0 0 -1 -1 -1", string.Join(" ", user, game,
+            OrvaneSDK.GetVersion(), OrvaneSDK.AnalyticsGameEnter(game, user),
             OrvaneSDK.AnalyticsInit(game, user), OrvaneSDK.AnalyticsSpecial(game, user, extra),
-            OrvaneSDK.AnalyticsGameExit(game, user), OrvaneSDK.AnalyticsGameEnter(null, user)), "identity, results");
+            OrvaneSDK.AnalyticsGameExit(game, user), OrvaneSDK.AnalyticsGameEnter(null, user),
+            OrvaneSDK.AnalyticsSpecial(game, user, "before\0after"), // a NUL: refused, never stored cut
+            OrvaneSDK.AnalyticsGameExit(game + "\0x", user)), "identity, results");
         OrvaneSDK.Initialize();
         Equal("ILogging initiated.|IAuthentication - OK|IReturn GameID - OK|IAnalytics ENTER - SDK was never " +
               "initialized. Initializing the SDK.|IInitialize() - OK.|WAnalytics ENTER - log was never initialized. " +
               "Initialized the game log|IAnalytics INIT - OK|IAnalytics ENTER - OK|WAnalytics INIT - log had been " +
               "already initialized.|IAnalytics SPECIAL - OK|IAnalytics EXIT - OK|EAnalytics ENTER - failed. Game id " +
-              "is empty|IInitialize() - OK.", string.Join("|", heard), "messages, level letter first");
+              "is empty|EAnalytics SPECIAL - failed. Text holds a NUL character.|EAnalytics EXIT - failed. " +
+              "Text holds a NUL character.|IInitialize() - OK.", string.Join("|", heard), "messages, level first");
         var run = new ProcessStartInfo(logcat, data + "/Orvane/Logs/demo42.log") {UseShellExecute = false,
             RedirectStandardOutput = true, StandardOutputEncoding = System.Text.Encoding.UTF8};
         Process reader = Process.Start(run);

@@ -1,58 +1,76 @@
 #!/bin/bash
-# The release archives as game teams take them, unpacked, and four tiny games
-# built against them: a Linux find_package, b Linux pkg-config, c mingw-w64
-# find_package, d MSVC ABI (clang + lld-link, OrvaneSDK.lib); c and d under wine.
-# The archive's orvane-logcat reads each one's first event back; then gdb must
-# find our source lines through the symbols archives.  consumers.sh PACKAGES WORK
+# The release archives as game teams take them, unpacked, and the README's adoption recipes run against
+# them exactly as written: each README block after a line `<!-- recipe: NAME -->` becomes the file NAME;
+# the *.sh ones run in the folder of the archives (CMake on Linux and cross-built for Windows with an
+# ordinary toolchain file, pkg-config, C# under mono); then the SDK folders are moved away and run.sh
+# starts every game (the Windows one under wine), read-logs.sh reads what they recorded. Beside the
+# recipes: an MSVC-ABI game (clang + lld-link, OrvaneSDK.lib) under wine, the Unity package of each
+# archive, no build templates, stripped binaries, and symbols that name no folder of the build machine
+# yet let gdb list our sources.  consumers.sh PACKAGES WORK
 set -euo pipefail
-here=$(cd "$(dirname "$0")" && pwd)
+here=$(cd "$(dirname "$0")" && pwd) root=$(cd "$(dirname "$0")/../.." && pwd)
 packages=$(cd "$1" && pwd) # WORK/wineprefix is kept between runs
-mkdir -p "$2" && cd "$2" && rm -rf run && mkdir -p run/b run/d
-export WINEPREFIX=$PWD/wineprefix WINEDEBUG=-all
+mkdir -p "$2" && cd "$2" && rm -rf run away && mkdir -p run/d away
+export WINEPREFIX=$PWD/wineprefix WINEDEBUG=-all XDG_DATA_HOME=$PWD/run/data CMAKE_GENERATOR=Ninja
 cd run
 for archive in "$packages"/OrvaneSDK-*; do cmake -E tar xf "$archive"; done
 linux=$(echo "$PWD"/OrvaneSDK-*-linux-*) windows=$(echo "$PWD"/OrvaneSDK-*-windows-*)
-export PKG_CONFIG_PATH=$linux/lib/pkgconfig
-flags=(-Wall -Wextra -Wpedantic -Werror "-DORVANE_EXPECTED_VERSION=\"$(pkg-config --modversion orvanesdk)\"")
 fail() { echo "FAILED: $*"; exit 1; }
 # run NAME COMMAND...: the output goes to NAME.log, shown when COMMAND fails.
-run() { "${@:2}" >>"$1.log" 2>&1 || { cat "$1.log"; fail "${*:2}"; }; }
-# first_event NAME DATA_DIR COMMAND...: the log COMMAND makes in DATA_DIR holds an INIT and an ENTER record.
-first_event() {
-  rm -rf "$2/Orvane" && run "$1" "${@:3}"
-  types=$("$linux/bin/orvane-logcat" "$2/Orvane/Logs/consumer.log" | grep -o '"type":"[A-Z]*"' | tr -d '\n')
-  [ "$types" = '"type":"INIT""type":"ENTER"' ] || fail "$1: the log holds $types"
-  echo "$1: first event recorded and read back"
-}
+run() { "${@:2}" >>"$1.log" 2>&1 </dev/null || { cat "$1.log"; fail "${*:2}"; }; }
+# types LOG: the types of LOG's records, read by the archive's orvane-logcat, as one word.
+types() { "$linux/bin/orvane-logcat" "$1" | grep -o '"type":"[A-Z]*"' | tr -d '\n'; }
 
-run a cmake -S "$here" -B a -G Ninja -DCMAKE_PREFIX_PATH="$linux"
-run a cmake --build a
-[[ $(readelf -d a/consumer) == *'(NEEDED)'*'[libOrvaneSDK.so.1]'* ]] || fail "a/consumer needs no libOrvaneSDK.so.1"
-XDG_DATA_HOME=$PWD/a first_event a "$PWD/a" a/consumer
-# shellcheck disable=SC2046 # pkg-config's flags are separate words
-run b cc "${flags[@]}" "$here/consumer.c" -o b/consumer $(pkg-config --cflags --libs orvanesdk) \
-  -Wl,-rpath,"$(pkg-config --variable=libdir orvanesdk)"
-XDG_DATA_HOME=$PWD/b first_event b "$PWD/b" b/consumer
-run c cmake -S "$here" -B c -G Ninja -DCMAKE_SYSTEM_NAME=Windows \
-  -DCMAKE_C_COMPILER=x86_64-w64-mingw32-gcc-posix -DCMAKE_PREFIX_PATH="$windows"
-run c cmake --build c
-# kernel32 and msvcrt come from mingw-w64's import libraries, which lld-link reads too.
-run d clang --target=x86_64-pc-windows-msvc -ffreestanding "${flags[@]}" -I"$windows/include" \
-  -c "$here/consumer.c" -o d/consumer.obj
-run d lld-link /nologo /entry:start /subsystem:console /nodefaultlib /out:d/consumer.exe d/consumer.obj \
-  "$windows/lib/OrvaneSDK.lib" /usr/x86_64-w64-mingw32/lib/lib{kernel32,msvcrt}.a
-# The prefix is made and written out (wineserver -w) before a game runs in it.
-wineboot -i </dev/null >/dev/null 2>&1 && wineserver -w
+awk '/^<!-- recipe: .* -->$/ { name = $3; system("mkdir -p $(dirname " name ")"); next }
+     name && /^```/ { if (open) name = ""; open = !open; next }
+     open { print > name }' "$root/README.md"
+wineboot -i </dev/null >/dev/null 2>&1 && wineserver -w # the prefix is made and written out first
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
 wineserver -p </dev/null >/dev/null 2>&1
-for game in c d; do
-  cp "$windows/bin/OrvaneSDK.dll" $game/
-  first_event $game "$WINEPREFIX/drive_c" bash "$here/../windows/wine_run.sh" "$WINEPREFIX" $game/consumer.exe
+for recipe in linux-cmake windows-cmake pkg-config csharp; do run $recipe bash -eu $recipe.sh; done
+mv "$linux" "$windows" ../away/
+rm -rf "$WINEPREFIX/drive_c/Orvane" && run games bash -eu run.sh
+mv ../away/* .
+run read-logs bash -eu read-logs.sh
+session='"type":"INIT""type":"ENTER""type":"SPECIAL"' next='"type":"ENTER""type":"SPECIAL"'
+[ "$(types data/Orvane/Logs/space-race.log)" = "$session$next$next" ] ||
+  fail "the Linux games' log holds $(types data/Orvane/Logs/space-race.log)"
+[ "$(types "$WINEPREFIX/drive_c/Orvane/Logs/space-race.log")" = "$session" ] || fail "the Windows game's log"
+[ "$(grep -c ' 3f6c2a9e-41d7-4b8e-9a0c-5d1e7f2b8c44 level=3$' read-logs.log)" = 3 ] || fail "read-logs.sh"
+grep -o 'OrvaneSDK-[^ ]*' msvc.bat | while read -r path; do
+  [ -e "${path//\\//}" ] || fail "msvc.bat: no $path"
 done
+version=$(PKG_CONFIG_PATH=$linux/lib/pkgconfig pkg-config --modversion orvanesdk)
+while read -r manifest; do # the archive's own binding and library, in the package it names
+  case $manifest in
+  *windows*) binding=$windows/bindings/csharp/OrvaneSDK.cs library=$windows/bin/OrvaneSDK.dll ;;
+  *) binding=$linux/share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs \
+    library=$linux/lib/libOrvaneSDK.so.$version ;;
+  esac
+  run unity cmake -DPACKAGE="$PWD/$(dirname "$manifest")" -DBINDING="$binding" -DLIBRARY="$library" \
+    -DVERSION="$version" -P "$here/../check_unity_package.cmake"
+done <unity-packages.txt
+
+# kernel32 and msvcrt come from mingw-w64's import libraries, which lld-link reads too.
+run d clang --target=x86_64-pc-windows-msvc -ffreestanding -Wall -Wextra -Wpedantic -Werror \
+  "-DORVANE_EXPECTED_VERSION=\"$version\"" -I"$windows/include" -c "$here/consumer.c" -o d/consumer.obj
+run d lld-link /nologo /entry:start /subsystem:console /nodefaultlib /out:d/consumer.exe d/consumer.obj \
+  "$windows/lib/OrvaneSDK.lib" /usr/x86_64-w64-mingw32/lib/lib{kernel32,msvcrt}.a
+cp "$windows/bin/OrvaneSDK.dll" d/
+rm -rf "$WINEPREFIX/drive_c/Orvane" && run d bash "$here/../windows/wine_run.sh" "$WINEPREFIX" d/consumer.exe
+[ "$(types "$WINEPREFIX/drive_c/Orvane/Logs/consumer.log")" = '"type":"INIT""type":"ENTER"' ] ||
+  fail "d's log"
 
 [ "$(stat -c %s "$windows/bin/OrvaneSDK.dll")" -lt 400000 ] || fail "OrvaneSDK.dll is not stripped"
+[ -z "$(find "$linux" "$windows" -name CMakeLists.txt -o -name '*.in')" ] || fail "build templates shipped"
+! grep -rlaF "$root" "$linux" "$windows" || fail "these files name the folder the release was built in"
 for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
-  gdb -batch -ex 'info line oAnalyticsGameEnter' -ex 'info line orvane::RecordEvent' "$library" >gdb.log 2>&1 || true
-  [ "$(grep -cE 'of ".*/src/(api/exports_analytics|analytics/event_recorder)\.cpp"' gdb.log)" = 2 ] ||
-    { cat gdb.log; fail "gdb finds no source lines of ours in $library"; }
+  gdb -batch -ex "set substitute-path /usr/src/orvanesdk-$version $root" -ex 'list oAnalyticsGameEnter' \
+    -ex 'info line orvane::RecordEvent' "$library" >gdb.log 2>&1 || true
+  if ! grep -q 'oAnalyticsGameEnter(const char \*gameId' gdb.log ||
+    ! grep -q "of \"/usr/src/orvanesdk-$version/src/analytics/event_recorder.cpp\"" gdb.log; then
+    cat gdb.log
+    fail "gdb lists no sources of ours for $library"
+  fi
 done
+echo "package: every recipe ran; the games recorded after the SDK folders were moved away"
