@@ -120,7 +120,7 @@ void BM_RecordLine(benchmark::State &state) {
     record.clear();
     line.clear();
     orvane::AppendEventRecord(record, kGameId, kUserId, "SPECIAL", clock.At(std::time(nullptr)), extra);
-    if (!orvane::EncryptRecordText(cipher, record, line)) std::abort();
+    if (!orvane::EncryptRecordText(cipher, orvane::TakeKeyText(kGameId), record, line)) std::abort();
     benchmark::DoNotOptimize(line.data());
   }
   state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(record.size()));

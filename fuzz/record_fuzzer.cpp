@@ -45,12 +45,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
         Fail("game id leaves the folder");
 
   static const std::string key_game_id(game_id);
-  orvane::TakeKeyText(key_game_id.c_str());
+  const orvane::KeyText &key_text = orvane::TakeKeyText(key_game_id.c_str());
   static orvane::RecordCipher cipher;
   const std::string time = orvane::FormatTimestampAt(std::time(nullptr));
   std::string record, hex;
   orvane::AppendEventRecord(record, game_id, user_id, type, time, extra);
-  if (!orvane::EncryptRecordText(cipher, record, hex)) Fail("not encrypted");
+  if (!orvane::EncryptRecordText(cipher, key_text, record, hex)) Fail("not encrypted");
   const std::optional<std::string> plain =
       orvane::testing::DecryptLine(hex, orvane::testing::KeyTextFor(key_game_id));
   if (plain != record) Fail("decrypts to another text");

@@ -52,14 +52,13 @@ TEST(Cipher, KnownAnswers) {
 
 // Lengths around the block size, the old 1023-byte limit and far past it.
 TEST(Cipher, EveryLengthDecryptsWhole) {
-  TakeKeyText("g1");
-  const KeyBlock &block = GetKeyBlock();
-  const std::string key(block.keyText.begin(), block.keyText.end());
+  const KeyText &key_text = TakeKeyText("g1");
+  const std::string key = KeyString(key_text);
   RecordCipher state;
   for (std::size_t length : {0, 1, 15, 16, 95, 96, 1023, 1024, 65536}) {
     std::string record(length, '\0'), hex;
     for (std::size_t i = 0; i < length; ++i) record[i] = static_cast<char>('!' + i % 90);
-    ASSERT_TRUE(EncryptRecordText(state, record, hex));
+    ASSERT_TRUE(EncryptRecordText(state, key_text, record, hex));
     EXPECT_EQ(hex.size(), 2 * (length / 16 + 1) * 16) << length;
     EXPECT_EQ(DecryptLine(hex, key), record) << length;
   }
@@ -71,14 +70,14 @@ TEST(Cipher, EveryLengthDecryptsWhole) {
     cipher::backend().encrypt = [](cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) {
       return std::ptrdiff_t{-1};
     };
-    EXPECT_FALSE(EncryptRecordText(state, "{}", hex));
+    EXPECT_FALSE(EncryptRecordText(state, key_text, "{}", hex));
     cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * {
       return nullptr;
     };
-    EXPECT_FALSE(EncryptRecordText(fresh, "{}", hex));
+    EXPECT_FALSE(EncryptRecordText(fresh, key_text, "{}", hex));
   }
   EXPECT_EQ(hex, "kept");
-  EXPECT_TRUE(EncryptRecordText(fresh, "{}", hex));
+  EXPECT_TRUE(EncryptRecordText(fresh, key_text, "{}", hex));
   EXPECT_EQ(DecryptLine(hex.substr(4), key), "{}");
 }
 

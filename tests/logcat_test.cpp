@@ -50,9 +50,12 @@ TEST(ValidUtf8, EscapesExactlyTheBytesNotPartOfUtf8) {
 std::size_t g_count = 0;
 // The last winner is tried first: a run of lines under one key costs one decryption a line.
 TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
-  TakeKeyText("g1"); // the library encrypts every line of this process under g1
+  const KeyText &key_text = TakeKeyText("g1"); // the library encrypts every line of this process under g1
   RecordCipher cipher;
-  auto encrypt = [&](std::string_view t, std::string h = "") { return EncryptRecordText(cipher, t, h), h; };
+  auto encrypt = [&](std::string_view t, std::string h = "") {
+    EncryptRecordText(cipher, key_text, t, h);
+    return h;
+  };
   const std::string good = encrypt(R"({"user_id":"u","game_id":"g","type":"T","time":"t","extra":""})");
   const std::vector<std::string> first = {"g1", "g2", "g3"}, last = {"g2", "g3", "g1"};
   CallsGuard guard;

@@ -13,7 +13,7 @@ namespace {
 class RecorderTest : public SandboxTest {
 protected:
   std::vector<std::string> Log() { // under the key of the first game id of this process
-    return Records(LogPath("g1"), std::string(GetKeyBlock().keyText.begin(), GetKeyBlock().keyText.end()));
+    return Records(LogPath("g1"), KeyString(TakeKeyText(nullptr)));
   }
 };
 

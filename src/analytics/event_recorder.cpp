@@ -132,6 +132,7 @@ struct Event {
   std::string_view user_id;
   const EventType &type;
   std::string_view extra;
+  const KeyText &key_text;
 };
 
 // Bytes of a game id that a message shows: hosts forward messages to their
@@ -217,7 +218,7 @@ Encoded EncodeLine(Workspace &space, const Event &event, const EventType &type, 
   space.record.clear();
   AppendEventRecord(space.record, event.game_id, event.user_id, type.name, time, extra);
   if (2 * cipher::CiphertextSize(space.record.size()) > kMaxLineBytes) return Encoded::kTooLarge;
-  if (!EncryptRecordText(space.cipher, space.record, out)) return Encoded::kCipherFailed;
+  if (!EncryptRecordText(space.cipher, event.key_text, space.record, out)) return Encoded::kCipherFailed;
   return Encoded::kLine;
 }
 
@@ -302,8 +303,8 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
 std::int32_t RecordEvent(MessageBatch &messages, const char *game_id, const char *user_id,
                          const EventType &type, const char *extra) {
   // The first event of the process fixes the key text, whatever its outcome.
-  TakeKeyText(game_id);
-  const Event event{Text(game_id), Text(user_id), type, Text(extra)};
+  const KeyText &key_text = TakeKeyText(game_id);
+  const Event event{Text(game_id), Text(user_id), type, Text(extra), key_text};
   if (event.game_id.empty()) {
     messages.Add(LogLevel::Error, type.game_id_empty);
     return -1;

@@ -83,7 +83,14 @@ std::ptrdiff_t DecryptCng(Session *session, const std::uint8_t *in, std::size_t 
   return static_cast<std::ptrdiff_t>(written);
 }
 
-const Backend kCng = {"cng", "bcrypt.dll with AES-CBC", OpenCng, CloseCng, EncryptCng, DecryptCng};
+const Backend kCng = {
+    .name = "cng",
+    .needs = "bcrypt.dll with AES-CBC",
+    .open = OpenCng,
+    .close = CloseCng,
+    .encrypt = EncryptCng,
+    .decrypt = DecryptCng,
+};
 Backend g_backend = kCng;
 
 } // namespace

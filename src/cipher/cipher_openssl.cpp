@@ -11,7 +11,8 @@ namespace orvane::cipher {
 struct Session {
   const LibCrypto *crypto = nullptr;
   EVP_CIPHER_CTX *encrypt = nullptr;
-  EVP_CIPHER_CTX *decrypt = nullptr;
+  EVP_CIPHER_CTX *decrypt = nullptr; // made by the first decryption: only a reader needs one
+  std::uint8_t key[kKeySize];
   std::uint8_t iv[kIvSize];
   // The block that the encrypt context chains its next block with: the IV
   // while nothing was encrypted, then the last ciphertext block.
@@ -45,13 +46,13 @@ Session *OpenOpenSsl(const std::uint8_t *key, const std::uint8_t *iv) {
   if (crypto == nullptr) return nullptr; // neither OpenSSL 3 nor 1.1 on this system
   auto *session = new Session;
   session->crypto = crypto;
+  std::memcpy(session->key, key, kKeySize);
   std::memcpy(session->iv, iv, kIvSize);
   std::memcpy(session->chain, iv, kIvSize);
-  session->encrypt = NewContext(*crypto, key, iv, 1);
-  session->decrypt = NewContext(*crypto, key, iv, 0);
   // Records are padded here and the encryption is never finished, so the
   // context only ever sees whole blocks and its own padding never applies.
-  if (session->encrypt == nullptr || session->decrypt == nullptr) {
+  session->encrypt = NewContext(*crypto, key, iv, 1);
+  if (session->encrypt == nullptr) {
     crypto->clear_error();
     CloseOpenSsl(session);
     return nullptr;
@@ -88,12 +89,18 @@ std::ptrdiff_t EncryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
 }
 
 std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::size_t size, std::uint8_t *out) {
-  EVP_CIPHER_CTX *ctx = session->decrypt;
-  int first = 0, second = 0;
   if (size > static_cast<std::size_t>(INT32_MAX / 2)) return -1;
+  const LibCrypto &crypto = *session->crypto;
+  if (session->decrypt == nullptr) session->decrypt = NewContext(crypto, session->key, session->iv, 0);
+  EVP_CIPHER_CTX *ctx = session->decrypt;
+  if (ctx == nullptr) {
+    crypto.clear_error();
+    return -1;
+  }
+  int first = 0;
+  int second = 0;
   // The final call refuses empty input, a partial block and bad padding, and
   // nothing is written past `size`: OpenSSL holds back the last block until then.
-  const LibCrypto &crypto = *session->crypto;
   bool ok = crypto.decrypt_init(ctx, nullptr, nullptr, nullptr, session->iv) == 1 &&
             crypto.decrypt_update(ctx, out, &first, in, static_cast<int>(size)) == 1 &&
             crypto.decrypt_final(ctx, out + first, &second) == 1;
@@ -105,7 +112,14 @@ std::ptrdiff_t DecryptOpenSsl(Session *session, const std::uint8_t *in, std::siz
 }
 
 constexpr char kNeeds[] = "OpenSSL's libcrypto.so.3 or libcrypto.so.1.1";
-const Backend kOpenSsl = {"openssl", kNeeds, OpenOpenSsl, CloseOpenSsl, EncryptOpenSsl, DecryptOpenSsl};
+const Backend kOpenSsl = {
+    .name = "openssl",
+    .needs = kNeeds,
+    .open = OpenOpenSsl,
+    .close = CloseOpenSsl,
+    .encrypt = EncryptOpenSsl,
+    .decrypt = DecryptOpenSsl,
+};
 Backend g_backend = kOpenSsl;
 
 } // namespace
