@@ -5,6 +5,7 @@
 
 #include <atomic>
 #include <thread>
+#include <vector>
 
 namespace orvane::testing {
 namespace {
@@ -52,6 +53,39 @@ TEST(LogChannel, WithdrawingWaitsForCallsOnOtherThreads) {
   oRegisterForLogs(nullptr);
   EXPECT_TRUE(g_returned);
   reporter.join();
+}
+
+// A replacement waits only for the deliveries that began before it: two
+// threads hand the callback on so that at every moment one is inside it,
+// old or new, and the registration still returns.
+std::atomic<int> g_entered{0};
+std::atomic<bool> g_relaying{true};
+void Relay() { // leaves once another delivery has entered after this one
+  const int mine = ++g_entered;
+  while (g_relaying && g_entered == mine) std::this_thread::yield();
+}
+void ORVANE_CALL RelayA(LogLevel, const char *) { Relay(); }
+void ORVANE_CALL RelayB(LogLevel, const char *) { Relay(); }
+
+TEST(LogChannel, ReplacingWaitsOnlyForEarlierDeliveries) {
+  std::vector<std::thread> reporters;
+  for (int i = 0; i < 2; ++i)
+    reporters.emplace_back([] {
+      while (g_relaying) LogToHost(LogLevel::Info, "[OrvaneSDK] note");
+    });
+  oRegisterForLogs(RelayA);
+  while (g_entered < 10) std::this_thread::yield();
+  std::atomic<bool> replaced{false};
+  std::thread registrar([&replaced] {
+    oRegisterForLogs(RelayB);
+    replaced = true;
+  });
+  for (int i = 0; i < 2000 && !replaced; ++i) std::this_thread::sleep_for(std::chrono::milliseconds(10));
+  EXPECT_TRUE(replaced) << "still waiting after 20 s for a moment without deliveries";
+  g_relaying = false;
+  registrar.join();
+  for (std::thread &reporter : reporters) reporter.join();
+  oRegisterForLogs(nullptr);
 }
 
 // A callback that withdraws itself does not wait for its own call (it would

@@ -12,6 +12,7 @@
 #include <pwd.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 namespace orvane::testing {
@@ -26,16 +27,40 @@ mode_t ModeOf(const std::string &path) {
 }
 
 // Owner-only whatever the umask: no other user may plant links or FIFOs where
-// the logs go, or read logs whose key follows from their names. Anything but
-// a regular file at a log path is refused at once: a FIFO would hang the
-// game, a link would let it write anywhere the game may.
+// the logs go, or read logs whose key follows from their names. The umask
+// narrows what is made (0177: folders nothing can be made in; 0277: a log
+// that cannot be opened again), so modes are set afterwards, and our folders
+// that an earlier run left so are mended. Anything but a regular file at a
+// log path is refused at once: a FIFO would hang the game, a link would let
+// it write anywhere the game may.
+std::string g_logs;
+platform::FileHandle OpenAsTheOwner(const char *path, platform::LockResult &lock, std::int64_t &size) {
+  return ModeOf(g_logs) & S_IXUSR ? os.open_log(path, lock, size) : platform::kNoFile; // root too
+}
+
 TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
-  const mode_t saved = ::umask(0);
-  ASSERT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  ::umask(saved);
-  for (const std::string &dir : {base_ + "/home", where_.base, where_.root, where_.logs})
-    EXPECT_EQ(ModeOf(dir), 0700u) << dir;
-  EXPECT_EQ(ModeOf(LogPath("g1")), 0600u);
+  const struct {
+    mode_t umask;
+    std::string left_broken; // a folder that an earlier run left at 0600
+  } cases[] = {{0, ""}, {0177, ""}, {0277, ""}, {0077, where_.root}, {0077, where_.logs}};
+  const std::string levels[] = {base_ + "/home", where_.base, where_.root, where_.logs};
+  g_logs = where_.logs;
+  for (const auto &c : cases) {
+    const CallsGuard restore;
+    platform::calls().open_log = OpenAsTheOwner;
+    RemoveTree(levels[0]);
+    for (const std::string &dir : levels) {
+      if (c.left_broken.empty()) break;
+      ::mkdir(dir.c_str(), dir == c.left_broken ? 0600 : 0700);
+      if (dir == c.left_broken) break;
+    }
+    const mode_t saved = ::umask(c.umask);
+    EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
+    ::umask(saved);
+    for (const std::string &dir : levels)
+      EXPECT_EQ(ModeOf(dir), 0700u) << dir << " umask " << c.umask << " " << c.left_broken;
+    EXPECT_EQ(ModeOf(LogPath("g1")), 0600u) << c.umask;
+  }
   WriteFile(base_ + "/outside", "kept");
   ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600) | ::mkfifo(LogPath("lonely").c_str(), 0600), 0);
   std::filesystem::create_symlink(base_ + "/outside", LogPath("link"));
@@ -60,32 +85,103 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
 }
 
 // A game may cancel a thread that is inside a call: the call runs to its
-// end, and the cancellation acts at the thread's next cancellation point.
+// end; a deferred cancellation acts at the thread's next cancellation point,
+// an asynchronous one as the call gives the thread's setting back.
 std::atomic<int> g_stage{0};
+int g_cancel_type = PTHREAD_CANCEL_DEFERRED;
 void ORVANE_CALL WaitInsideCallback(LogLevel, const char *message) {
   if (std::string_view(message).find("Analytics") == std::string_view::npos) return;
   g_stage = 1;
   while (g_stage != 2) ::usleep(1000); // a cancellation point
 }
 void *RecordOnce(void *) {
+  pthread_setcanceltype(g_cancel_type, nullptr);
   g_stage = 3 + oAnalyticsInit("g1", "u1");
   pthread_testcancel();
   return nullptr;
+}
+pthread_t RecordAndWaitInsideTheCallback() {
+  g_stage = 0;
+  pthread_t thread;
+  EXPECT_EQ(pthread_create(&thread, nullptr, RecordOnce, nullptr), 0);
+  while (g_stage != 1) ::usleep(1000);
+  return thread;
 }
 
 TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   std::filesystem::create_directories(where_.logs); // one message from the library: "INIT - OK"
   oRegisterForLogs(WaitInsideCallback);
-  pthread_t thread;
-  ASSERT_EQ(pthread_create(&thread, nullptr, RecordOnce, nullptr), 0);
-  while (g_stage != 1) ::usleep(1000);
-  pthread_cancel(thread);
+  for (const int type : {PTHREAD_CANCEL_DEFERRED, PTHREAD_CANCEL_ASYNCHRONOUS}) {
+    std::filesystem::remove(LogPath("g1"));
+    g_cancel_type = type;
+    const pthread_t thread = RecordAndWaitInsideTheCallback();
+    pthread_cancel(thread);
+    g_stage = 2;
+    void *outcome = nullptr;
+    pthread_join(thread, &outcome);
+    EXPECT_EQ(outcome, PTHREAD_CANCELED) << type;
+    EXPECT_EQ(g_stage, type == PTHREAD_CANCEL_DEFERRED ? 3 : 2) << "the call returned";
+    EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "") << type;
+  }
+}
+
+// A child forked while another thread is inside a callback has only the
+// forking thread: its registration waits for no delivery of the parent's.
+TEST_F(PosixTest, AChildForkedDuringADeliveryRegistersAtOnce) {
+  std::filesystem::create_directories(where_.logs);
+  oRegisterForLogs(WaitInsideCallback);
+  const pthread_t thread = RecordAndWaitInsideTheCallback();
+  const pid_t child = ::fork();
+  if (child == 0) {
+    oRegisterForLogs(nullptr);
+    ::_exit(0);
+  }
+  int status = 0;
+  pid_t ended = 0;
+  for (int i = 0; i < 1000 && (ended = ::waitpid(child, &status, WNOHANG)) == 0; ++i) ::usleep(10000);
+  if (ended == 0) {
+    ::kill(child, SIGKILL);
+    ::waitpid(child, &status, 0);
+  }
   g_stage = 2;
-  void *outcome = nullptr;
-  pthread_join(thread, &outcome);
-  EXPECT_EQ(outcome, PTHREAD_CANCELED);
-  EXPECT_EQ(g_stage, 3);
-  EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
+  pthread_join(thread, nullptr);
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << "the child hung";
+}
+
+// A writer that dies during its write leaves that line torn; nothing can
+// make a write atomic against the process's own death. The torn line stays
+// alone on its line, every later line is whole, and the reader reports it.
+// When it was the log's first line, the log begins with it, not with INIT.
+bool DieHalfway(platform::FileHandle f, const void *d, std::size_t n) { // within the first line
+  os.append(f, d, n / 4);
+  ::raise(SIGKILL);
+  return false;
+}
+
+TEST_F(PosixTest, AWriterDyingMidLineTearsOnlyThatLine) {
+  ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
+  for (const char *game : {"g1", "g2"}) {
+    const pid_t child = ::fork();
+    if (child == 0) {
+      platform::calls().append = DieHalfway;
+      oAnalyticsGameEnter(game, "u1");
+      ::_exit(0);
+    }
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFSIGNALED(status));
+    EXPECT_EQ(oAnalyticsGameExit(game, "u1"), 0);
+  }
+  const auto rec = [](const std::string &game, const std::string &type) {
+    return R"({"user_id":"u1","game_id":")" + game + R"(","type":")" + type + R"(","time":"T","extra":""})";
+  };
+  const std::string key = KeyTextFor("g1"), torn = "(undecryptable)";
+  EXPECT_EQ(Records(LogPath("g1"), key),
+            (std::vector<std::string>{rec("g1", "INIT"), torn, rec("g1", "EXIT")}));
+  EXPECT_EQ(Records(LogPath("g2"), key), (std::vector<std::string>{torn, rec("g2", "EXIT")}));
+  const ChildResult check = RunChild(ORVANE_LOGCAT_PATH, {"orvane-logcat", "--check", LogPath("g1")});
+  EXPECT_EQ(check.exit_code, 1);
+  EXPECT_NE(check.output.find("g1.log:2: "), std::string::npos) << check.output;
 }
 
 // The platform layer on real files: a full disk takes part of a write, and
@@ -95,8 +191,9 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
 TEST_F(PosixTest, PlatformCallsOnRealFiles) {
   std::filesystem::create_directories(where_.logs);
   std::int64_t size = -1;
-  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), size),
-                             second = os.open_log(LogPath("g1").c_str(), size);
+  platform::LockResult lock[2];
+  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), lock[0], size),
+                             second = os.open_log(LogPath("g1").c_str(), lock[1], size);
   rlimit saved, full;
   ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
   full = saved, full.rlim_cur = 4;
@@ -106,28 +203,40 @@ TEST_F(PosixTest, PlatformCallsOnRealFiles) {
   ::setrlimit(RLIMIT_FSIZE, &saved);
   std::signal(SIGXFSZ, previous);
   EXPECT_EQ(os.file_size(first), 4);
-  EXPECT_EQ(os.try_lock_file(first), platform::LockResult::kLocked);
-  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kBusy);
-  os.unlock_file(first);
-  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kLocked);
+  using platform::LockMode;
+  const platform::LockResult locked = platform::LockResult::kLocked, busy = platform::LockResult::kBusy;
+  EXPECT_TRUE(lock[0] == locked && lock[1] == locked) << "both opens hold the log shared";
+  EXPECT_EQ(os.try_lock_file(first, LockMode::kExclusive), busy);
+  EXPECT_EQ(os.try_lock_file(second, LockMode::kExclusive), locked) << "the failed conversion held none";
+  EXPECT_EQ(os.try_lock_file(first, LockMode::kShared), busy);
+  os.unlock_file(second);
+  EXPECT_EQ(os.try_lock_file(first, LockMode::kShared), locked);
   EXPECT_TRUE(os.close_file(first) && os.close_file(second));
   const std::int64_t before = os.steady_milliseconds();
   os.sleep_milliseconds(30);
   EXPECT_GE(os.steady_milliseconds() - before, 25);
 }
 
-// Buffers that one large event grew past 1 MiB are given back when its call
-// ends (measured by glibc; a sanitizer's allocator reports nothing here).
+// Buffers that one large call grew past 1 MiB are given back when it ends
+// (measured by glibc; a sanitizer's allocator reports nothing here).
 TEST_F(PosixTest, LargeEventsGiveTheirBuffersBack) {
   ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
   const auto in_use = [] {
     const struct mallinfo2 heap = ::mallinfo2();
     return heap.uordblks + heap.hblkhd;
   };
-  const std::string user(std::size_t{3} << 19, 'u'); // 1.5 MiB records, 3 MiB lines, the INIT line's too
-  const std::size_t before = in_use();
-  EXPECT_EQ(oAnalyticsGameEnter("g2", user.c_str()), 0);
-  EXPECT_LT(in_use(), before + (std::size_t{1} << 19));
+  const std::string large(std::size_t{3} << 19, 'x');
+  const struct {
+    const char *name, *game, *user;
+    int result;
+  } cases[] = {{"1.5 MiB records, 3 MiB lines, the INIT line's too", "g2", large.c_str(), 0},
+               {"a 1.5 MiB path of a game id no file may have", large.c_str(), "u1", -1}};
+  for (const auto &c : cases) {
+    const std::size_t before = in_use();
+    EXPECT_EQ(oAnalyticsGameEnter(c.game, c.user), c.result);
+    Captured().clear();
+    EXPECT_LT(in_use(), before + (std::size_t{1} << 19)) << c.name;
+  }
 }
 
 // Where the files go on POSIX: XDG_DATA_HOME when absolute, else an absolute

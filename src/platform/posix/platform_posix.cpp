@@ -24,22 +24,45 @@ bool DirectoryExistsPosix(const char *path) {
 
 // Owner-only whatever the umask: another local user must not be able to
 // plant links or FIFOs where the logs go, or read logs whose key follows from
-// their names.
-bool MakeDirectoryPosix(const char *path) { return ::mkdir(path, 0700) == 0; }
+// their names. The mode is set after mkdir, which the umask narrows (0177
+// would leave a folder nothing can be made in); a folder of ours that an
+// earlier run left so is mended, a link at its place is left alone.
+bool MakeDirectoryPosix(const char *path) {
+  if (::mkdir(path, 0700) != 0 && errno != EEXIST) return false;
+  struct stat st;
+  if (::lstat(path, &st) != 0 || !S_ISDIR(st.st_mode)) return false;
+  return (st.st_mode & 07777) == 0700 || ::chmod(path, 0700) == 0;
+}
 
 bool MakePrivateDirectoriesPosix(const char *path) {
   const std::string_view whole(path);
   // Create each missing level from the top, so that a missing parent of the
-  // data directory gets the same owner-only mode.
+  // data directory gets the same owner-only mode; levels that exist are the
+  // account's own and keep theirs.
   for (std::size_t end = 0; end != std::string_view::npos;) {
     end = whole.find('/', end + 1);
     const std::string level(whole.substr(0, end));
-    if (::mkdir(level.c_str(), 0700) != 0 && errno != EEXIST) return false;
+    if (::mkdir(level.c_str(), 0700) == 0) {
+      ::chmod(level.c_str(), 0700);
+    } else if (errno != EEXIST) {
+      return false;
+    }
   }
   return DirectoryExistsPosix(path);
 }
 
-FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
+LockResult TryLockFilePosix(FileHandle file, LockMode mode) {
+  // flock, not fcntl: an flock belongs to the open file description, so two
+  // opens of one log in this process exclude each other as two processes do,
+  // and closing another descriptor of the file does not drop it. Linux
+  // converts a held lock by dropping it first, so a failed conversion holds
+  // none and two writers converting at once cannot wait for each other.
+  const int operation = mode == LockMode::kShared ? LOCK_SH : LOCK_EX;
+  if (::flock(static_cast<int>(file), operation | LOCK_NB) == 0) return LockResult::kLocked;
+  return errno == EWOULDBLOCK || errno == EINTR ? LockResult::kBusy : LockResult::kFailed;
+}
+
+FileHandle OpenLogPosix(const char *path, LockResult &lock, std::int64_t &size) {
   // O_NOFOLLOW: a link at the log path would let the library write anywhere
   // the game may. O_NONBLOCK: opening a FIFO must not hang the game.
   int fd;
@@ -47,6 +70,7 @@ FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
     fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600);
   } while (fd < 0 && errno == EINTR);
   if (fd < 0) return kNoFile;
+  lock = TryLockFilePosix(fd, LockMode::kShared);
   struct stat st;
   if (::fstat(fd, &st) != 0) {
     size = -1;
@@ -55,6 +79,9 @@ FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
     return kNoFile;
   } else {
     size = st.st_size;
+    // A new log gets the mode the umask may have narrowed (0400 under 0277
+    // would refuse the next open); one with content keeps what it has.
+    if (size == 0 && (st.st_mode & 07777) != 0600) ::fchmod(fd, 0600);
   }
   return fd;
 }
@@ -88,14 +115,6 @@ bool CloseFilePosix(FileHandle file) {
   // On Linux the descriptor is released even when close reports EINTR, so it
   // is never retried.
   return ::close(static_cast<int>(file)) == 0;
-}
-
-LockResult TryLockFilePosix(FileHandle file) {
-  // flock, not fcntl: an flock belongs to the open file description, so two
-  // opens of one log in this process exclude each other as two processes do,
-  // and closing another descriptor of the file does not drop it.
-  if (::flock(static_cast<int>(file), LOCK_EX | LOCK_NB) == 0) return LockResult::kLocked;
-  return errno == EWOULDBLOCK || errno == EINTR ? LockResult::kBusy : LockResult::kFailed;
 }
 
 void UnlockFilePosix(FileHandle file) { ::flock(static_cast<int>(file), LOCK_UN); }
@@ -190,7 +209,14 @@ StorageLocation default_storage_location() {
 
 std::string_view line_break() { return "\n"; }
 
-CancellationOff::CancellationOff() { ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &previous); }
-CancellationOff::~CancellationOff() { ::pthread_setcancelstate(previous, nullptr); }
+int DisableCancellation() noexcept {
+  int previous = PTHREAD_CANCEL_ENABLE;
+  ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &previous);
+  return previous;
+}
+
+void RestoreCancellation(int previous) { ::pthread_setcancelstate(previous, nullptr); }
+
+void RunInForkedChildren(void (*reset)()) { ::pthread_atfork(nullptr, nullptr, reset); }
 
 } // namespace orvane::platform
