@@ -96,8 +96,9 @@ typedef OrvaneLogCallback LogCallback;
  *
  * It returns only when no other thread is still inside the previous
  * callback, so the host may then free it or unload the code behind it
- * (a script domain, a plugin). Called from inside a callback, it does not
- * wait for that call itself. Do not call it while holding a lock that the
+ * (a script domain, a plugin); it waits only for deliveries that began
+ * before it, however steadily other threads report. Called from inside a
+ * callback, it does not wait for that call itself. Do not call it while holding a lock that the
  * callback takes, nor from callbacks on two threads at once: each would wait
  * for the other.
  */
@@ -135,17 +136,21 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  *                                                  result -1; also for a game
  *                                                  id that is not a plain file
  *                                                  name (see below)
- *   ERROR   "log file failed to write."            result -1 (disk full, I/O); a
- *                                                  first line that did not go
- *                                                  in whole is cut away (on a
+ *   ERROR   "log file failed to write."            result -1 (disk full, I/O,
+ *                                                  or the log's size could
+ *                                                  not be measured); a first
+ *                                                  line that did not go in
+ *                                                  whole is cut away (on a
  *                                                  file system that locks
  *                                                  files)
  *   ERROR   "log file is locked by another process."
- *                                                  result -1: the log was
- *                                                  empty and another writer
- *                                                  held it for over a second
- *                                                  (a file system without
- *                                                  locks never refuses)
+ *                                                  result -1: another writer
+ *                                                  held the log for over a
+ *                                                  second while starting it,
+ *                                                  or kept this one from
+ *                                                  starting it (a file system
+ *                                                  without locks never
+ *                                                  refuses)
  *   ERROR   "failed. Record encryption failed."    result -1
  *   ERROR   "failed. Record too large."            result -1: the line would
  *                                                  exceed 64 MiB; nothing
