@@ -105,56 +105,40 @@ platform::FileHandle OpenWithUnknownSize(const char *path, LockResult &lock, std
   size = -1;
   return f;
 }
-// Another writer records while this one writes, and finds the log as this
-// write left it: begun, or torn before it is cut back.
-void AnotherRecords() {
+// Another writer records while this one writes: into an empty log, or one torn (g_tear), not yet cut back.
+bool g_tear;
+bool AnotherRecordsMeanwhile(platform::FileHandle f, const void *d, std::size_t n) {
   platform::calls().append = Os().append;
+  if (g_tear) Os().append(f, d, n / 3);
   oAnalyticsGameEnter("g1", "u1");
-}
-bool AnotherRecordsFirst(platform::FileHandle f, const void *d, std::size_t n) {
-  AnotherRecords();
-  return Os().append(f, d, n);
-}
-bool TornWhileAnotherRecords(platform::FileHandle f, const void *d, std::size_t n) {
-  Os().append(f, d, n / 3);
-  AnotherRecords();
-  return false;
+  return !g_tear && Os().append(f, d, n);
 }
 void TearWhileAnotherRecords() { // the other writer's wait ends at the first reading of its deadline
-  platform::calls().append = TornWhileAnotherRecords;
+  g_tear = true;
+  platform::calls().append = AnotherRecordsMeanwhile;
   platform::calls().steady_milliseconds = [] { return g_now_ms += 2000; };
 }
-void NoLocks() {
+void NoLocks(bool (*append)(platform::FileHandle, const void *, std::size_t)) {
   platform::calls().open_log = [](const char *path, LockResult &lock, std::int64_t &size) {
     const platform::FileHandle f = Os().open_log(path, lock, size);
     lock = LockResult::kFailed;
     return f;
   };
   platform::calls().try_lock_file = [](platform::FileHandle, LockMode) { return LockResult::kFailed; };
-}
-void NoLocksAndAnotherStarts() {
-  NoLocks();
-  platform::calls().append = AnotherRecordsFirst;
-}
-void NoLocksAndAShortWrite() {
-  NoLocks();
-  platform::calls().append = ShortAppend;
+  platform::calls().append = append;
 }
 // Another writer holds the lock past the wait; time moves 100 ms per reading
 // of the clock, however short the pauses.
 int g_lock_tries, g_pauses;
 LockResult BusyLock(platform::FileHandle, LockMode) { return ++g_lock_tries, LockResult::kBusy; }
-LockResult RivalStartsTheLog(platform::FileHandle file, LockMode mode) { // then the lock is had
+LockResult RivalStartsTheLog(platform::FileHandle file, LockMode mode) { // at the first try, then gone
+  if (g_lock_tries++ > 0) return Os().try_lock_file(file, mode);
   std::int64_t size = 0;
   LockResult lock;
   const platform::FileHandle rival = Os().open_log((g_logs + "g1.log").c_str(), lock, size);
   if (size == 0) Os().append(rival, "rival-init", 10);
   Os().close_file(rival);
-  ++g_lock_tries;
-  return Os().try_lock_file(file, mode);
-}
-LockResult RivalStartsTheLogDuringTheWait(platform::FileHandle file, LockMode mode) {
-  return g_lock_tries ? RivalStartsTheLog(file, mode) : BusyLock(file, mode);
+  return LockResult::kBusy;
 }
 void InjectBusyLock(LockResult (*lock)(platform::FileHandle, LockMode)) {
   platform::calls().try_lock_file = lock;
@@ -183,7 +167,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
             open_failed}, {}},
       {"a log that exists empty starts with INIT", false, [] { WriteFile(g_logs + "g1.log", ""); },
        0, {kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER")}},
-      {"write fails: the fragment stays apart", true, [] { platform::calls().append = ShortAppend; },
+      {"write fails: the fragment stays apart, as one torn by a writer's death, and later lines are whole", true, [] { platform::calls().append = ShortAppend; },
        -1, {write_failed}, {Rec("INIT"), kTorn}},
       {"first write fails: cut back, so no log starts without INIT", false, [] { platform::calls().append = ShortAppend; },
        -1, {kNeverInitialized, A(2, "INIT", "log file failed to write."), write_failed}, {}},
@@ -201,18 +185,13 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
        -1, {write_failed}, {}},
       {"empty log locked by another writer past the deadline", false, [] { InjectBusyLock(BusyLock); },
        -1, {locked_out}, {}},
-      {"another writer starts the log during the wait: after a line break", false,
-       [] { InjectBusyLock(RivalStartsTheLogDuringTheWait); },
+      {"another writer starts the log during the wait: after a line break", false, [] { InjectBusyLock(RivalStartsTheLog); },
        0, {ok}, {kTorn, Rec("ENTER")}},
-      {"another writer starts the log before the lock is had", false, [] { InjectBusyLock(RivalStartsTheLog); },
-       0, {ok}, {kTorn, Rec("ENTER")}},
-      {"a file system without locks: the log starts all the same", false, NoLocks,
-       0, {kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER")}},
-      {"... two writers that both find it empty keep their lines apart", false,
-       NoLocksAndAnotherStarts,
+      {"a file system without locks: the log starts all the same, and two writers finding it empty keep their lines apart", false,
+       [] { NoLocks(AnotherRecordsMeanwhile); },
        0, {kNeverInitialized, init_ok, ok, kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
-      {"... and a torn first line stays: without the lock, cutting back could cut another writer's line", false,
-       NoLocksAndAShortWrite,
+      {"... a torn first line stays: without the lock, cutting back could cut another writer's line", false,
+       [] { NoLocks(ShortAppend); },
        -1, {kNeverInitialized, A(2, "INIT", "log file failed to write."), write_failed}, {kTorn}},
       {"an exception under the lock gives lock and file back", false,
        [] { platform::calls().append = [](platform::FileHandle, const void *, std::size_t) -> bool { throw std::bad_alloc(); }; },
@@ -229,6 +208,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     }
     Captured().clear();
     g_lock_tries = g_pauses = 0;
+    g_tear = false;
     {
       const CallsGuard restore;
       c.inject();
@@ -241,6 +221,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     Captured().clear(); // and the recorder is whole again
     EXPECT_EQ(oAnalyticsGameExit("g1", "u1"), 0);
     EXPECT_EQ(Captured().back(), A(0, "EXIT", "OK"));
+    EXPECT_EQ(Log().back(), Rec("EXIT"));
   }
 }
 
