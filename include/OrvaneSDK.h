@@ -157,8 +157,9 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  *                                                  written
  *   ERROR   "failed. Internal error."              result -1 (out of memory)
  *
- * Only a regular file is a log: a link, FIFO or device at the log's path is
- * refused as a bad game id. A game id must be usable as a file name on every platform: it is refused
+ * Only a regular file is a log: a link, FIFO, terminal or a device that reads
+ * as empty at the log's path is refused as a bad game id (on Linux a block
+ * device, which only root can place, is not looked for). A game id must be usable as a file name on every platform: it is refused
  * when it is "." or "..", holds a byte below 0x20 or one of / \ : * ? " < > |,
  * ends in "." or " ", or its part before the first "." is a Windows device
  * name (CON, PRN, AUX, NUL, CONIN$, CONOUT$, COM0-COM9, LPT0-LPT9, also
