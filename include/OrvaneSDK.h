@@ -96,8 +96,9 @@ typedef OrvaneLogCallback LogCallback;
  *
  * It returns only when no other thread is still inside the previous
  * callback, so the host may then free it or unload the code behind it
- * (a script domain, a plugin). Called from inside a callback, it does not
- * wait for that call itself. Do not call it while holding a lock that the
+ * (a script domain, a plugin); it waits only for deliveries that began
+ * before it, however steadily other threads report. Called from inside a
+ * callback, it does not wait for that call itself. Do not call it while holding a lock that the
  * callback takes, nor from callbacks on two threads at once: each would wait
  * for the other.
  */
@@ -138,25 +139,30 @@ ORVANE_API void ORVANE_CALL oInitialize(void);
  *                                                  over 256 bytes shows its
  *                                                  first 256 and "...", and
  *                                                  control bytes as \xNN
- *   ERROR   "log file failed to write."            result -1 (disk full, I/O); a
- *                                                  first line that did not go
- *                                                  in whole is cut away (on a
+ *   ERROR   "log file failed to write."            result -1 (disk full, I/O,
+ *                                                  or the log's size could
+ *                                                  not be measured); a first
+ *                                                  line that did not go in
+ *                                                  whole is cut away (on a
  *                                                  file system that locks
  *                                                  files)
  *   ERROR   "log file is locked by another process."
- *                                                  result -1: the log was
- *                                                  empty and another writer
- *                                                  held it for over a second
- *                                                  (a file system without
- *                                                  locks never refuses)
+ *                                                  result -1: another writer
+ *                                                  held the log for over a
+ *                                                  second while starting it,
+ *                                                  or kept this one from
+ *                                                  starting it (a file system
+ *                                                  without locks never
+ *                                                  refuses)
  *   ERROR   "failed. Record encryption failed."    result -1
  *   ERROR   "failed. Record too large."            result -1: the line would
  *                                                  exceed 64 MiB; nothing
  *                                                  written
  *   ERROR   "failed. Internal error."              result -1 (out of memory)
  *
- * Only a regular file is a log: a link, FIFO or device at the log's path is
- * refused as a bad game id. A game id must be usable as a file name on every platform: it is refused
+ * Only a regular file is a log: a link, FIFO, terminal or a device that reads
+ * as empty at the log's path is refused as a bad game id (on Linux a block
+ * device, which only root can place, is not looked for). A game id must be usable as a file name on every platform: it is refused
  * when it is "." or "..", holds a byte below 0x20 or one of / \ : * ? " < > |,
  * ends in "." or " ", or its part before the first "." is a Windows device
  * name (CON, PRN, AUX, NUL, CONIN$, CONOUT$, COM0-COM9, LPT0-LPT9, also

@@ -15,3 +15,8 @@ string(REGEX MATCHALL "(_GLOBAL__sub_I_[^\n]*|__cxa_atexit|__cxa_thread_atexit[^
 if(load_or_exit)
   message(FATAL_ERROR "the library runs code at load or at exit: ${load_or_exit}")
 endif()
+# dlclose must not unload it: each load and unload would leak what the load set up.
+execute_process(COMMAND readelf -d ${LIBRARY} OUTPUT_VARIABLE dynamic COMMAND_ERROR_IS_FATAL ANY)
+if(NOT dynamic MATCHES "FLAGS_1[^\n]*NODELETE")
+  message(FATAL_ERROR "the library can be unloaded: it is not linked with -z nodelete")
+endif()

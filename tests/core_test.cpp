@@ -34,24 +34,34 @@ TEST(LogChannel, DeliversToTheRegisteredCallbackOnly) {
   oRegisterForLogs(nullptr);
 }
 
-// Withdrawing a callback waits for its calls on other threads: this one is
-// still running when the unregistering thread arrives, and has returned
-// when oRegisterForLogs does.
-std::atomic<bool> g_inside{false}, g_returned{false};
-void ORVANE_CALL Linger(LogLevel, const char *message) {
-  if (message[12] != 'n') return;
-  g_inside = true;
-  std::this_thread::sleep_for(std::chrono::milliseconds(200));
-  g_returned = true;
+// A registration waits for the other threads' deliveries that began before it
+// and only for those: two threads keep one inside the callback at every
+// moment, yet a replacement returns, with none left in the old one.
+std::atomic<int> g_entered{0}, g_inside_a{0};
+std::atomic<bool> g_relaying{true};
+void Relay() { // leaves once another delivery has entered after this one
+  const int mine = ++g_entered;
+  while (g_relaying && g_entered == mine) std::this_thread::yield();
 }
+void ORVANE_CALL RelayA(LogLevel, const char *) {
+  ++g_inside_a;
+  Relay();
+  --g_inside_a;
+}
+void ORVANE_CALL RelayB(LogLevel, const char *) { Relay(); }
 
-TEST(LogChannel, WithdrawingWaitsForCallsOnOtherThreads) {
-  oRegisterForLogs(Linger);
-  std::thread reporter([] { LogToHost(LogLevel::Info, "[OrvaneSDK] note"); });
-  while (!g_inside) std::this_thread::yield();
+TEST(LogChannel, ReplacingWaitsOnlyForEarlierDeliveries) {
+  const auto report = [] {
+    while (g_relaying) LogToHost(LogLevel::Info, "[OrvaneSDK] note");
+  };
+  std::thread first(report), second(report);
+  oRegisterForLogs(RelayA);
+  while (g_entered < 10) std::this_thread::yield();
+  oRegisterForLogs(RelayB); // before: waited for a moment without deliveries, which never came
+  EXPECT_EQ(g_inside_a, 0);
+  g_relaying = false;
+  for (std::thread *reporter : {&first, &second}) reporter->join();
   oRegisterForLogs(nullptr);
-  EXPECT_TRUE(g_returned);
-  reporter.join();
 }
 
 // A callback that withdraws itself does not wait for its own call (it would

@@ -62,7 +62,7 @@ TEST_F(SandboxTest, IdentityResultsAndMessages) {
   const Case cases[] = {
       {{exe, U("--userUuid--a1b2c3d4"), U("--gameId--demo42")}, true, "a1b2c3d4", "demo42", {uuid_ok, game_ok, game_ok}},
       {{exe, U("--userUuid--"), U("--gameId--")}, true, "", "", {uuid_failed, game_empty, game_empty}},
-      {{exe, U("--gameId--z")}, false, "", "", {}}, // the split fails: no message
+      {{exe, U("--gameId--z")}, false, "", "", {uuid_failed, game_empty, game_empty}}, // the split fails
       // a value that reads empty is none; the text ends at a zero byte
       {{exe, u"--userUuid--\u0100abc", std::u16string(u"--gameId--ab\0cd", 15)}, true, "", "ab",
        {uuid_failed, game_ok, game_ok}}};

@@ -12,6 +12,7 @@
 #include <pwd.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 namespace orvane::testing {
@@ -26,16 +27,30 @@ mode_t ModeOf(const std::string &path) {
 }
 
 // Owner-only whatever the umask: no other user may plant links or FIFOs where
-// the logs go, or read logs whose key follows from their names. Anything but
-// a regular file at a log path is refused at once: a FIFO would hang the
-// game, a link would let it write anywhere the game may.
+// the logs go, or read logs whose key follows from their names; modes are
+// set after the umask narrowed them, and our folders left so are mended.
+// Anything but a regular file at a log path is refused at once: a FIFO would
+// hang the game, a link would let it write anywhere the game may.
 TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
-  const mode_t saved = ::umask(0);
-  ASSERT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  ::umask(saved);
-  for (const std::string &dir : {base_ + "/home", where_.base, where_.root, where_.logs})
-    EXPECT_EQ(ModeOf(dir), 0700u) << dir;
-  EXPECT_EQ(ModeOf(LogPath("g1")), 0600u);
+  // A umask, and a folder that an earlier run left at 0600.
+  const std::pair<mode_t, std::string> cases[] = {
+      {0, ""}, {0177, ""}, {0277, ""}, {0077, where_.root}, {0077, where_.logs}};
+  const std::string levels[] = {base_ + "/home", where_.base, where_.root, where_.logs};
+  for (const auto &[umask, left_broken] : cases) {
+    const CallsGuard restore;
+    platform::calls().open_log = [](const char *path, platform::LockResult &lock, std::int64_t &size) {
+      const std::string logs = std::filesystem::path(path).parent_path(); // as for other users than root
+      return ModeOf(logs) & S_IXUSR ? os.open_log(path, lock, size) : platform::kNoFile;
+    };
+    RemoveTree(levels[0]);
+    const mode_t saved = ::umask(umask);
+    if (!left_broken.empty() && std::filesystem::create_directories(left_broken))
+      ::chmod(left_broken.c_str(), 0600);
+    EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
+    ::umask(saved);
+    for (const std::string &dir : levels) EXPECT_EQ(ModeOf(dir), 0700u) << dir << " " << umask << left_broken;
+    EXPECT_EQ(ModeOf(LogPath("g1")), 0600u) << umask;
+  }
   WriteFile(base_ + "/outside", "kept");
   ASSERT_EQ(::mkfifo(LogPath("fifo").c_str(), 0600) | ::mkfifo(LogPath("lonely").c_str(), 0600), 0);
   std::filesystem::create_symlink(base_ + "/outside", LogPath("link"));
@@ -60,14 +75,18 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
 }
 
 // A game may cancel a thread that is inside a call: the call runs to its
-// end, and the cancellation acts at the thread's next cancellation point.
+// end; a deferred cancellation acts at the thread's next cancellation point,
+// an asynchronous one as the call gives the thread's setting back. A child
+// forked meanwhile waits for no delivery of the parent's other threads.
 std::atomic<int> g_stage{0};
+int g_cancel_type;
 void ORVANE_CALL WaitInsideCallback(LogLevel, const char *message) {
   if (std::string_view(message).find("Analytics") == std::string_view::npos) return;
   g_stage = 1;
   while (g_stage != 2) ::usleep(1000); // a cancellation point
 }
 void *RecordOnce(void *) {
+  pthread_setcanceltype(g_cancel_type, nullptr);
   g_stage = 3 + oAnalyticsInit("g1", "u1");
   pthread_testcancel();
   return nullptr;
@@ -76,16 +95,28 @@ void *RecordOnce(void *) {
 TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
   std::filesystem::create_directories(where_.logs); // one message from the library: "INIT - OK"
   oRegisterForLogs(WaitInsideCallback);
-  pthread_t thread;
-  ASSERT_EQ(pthread_create(&thread, nullptr, RecordOnce, nullptr), 0);
-  while (g_stage != 1) ::usleep(1000);
-  pthread_cancel(thread);
-  g_stage = 2;
-  void *outcome = nullptr;
-  pthread_join(thread, &outcome);
-  EXPECT_EQ(outcome, PTHREAD_CANCELED);
-  EXPECT_EQ(g_stage, 3);
-  EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "");
+  for (const int type : {PTHREAD_CANCEL_DEFERRED, PTHREAD_CANCEL_ASYNCHRONOUS}) {
+    g_cancel_type = type;
+    pthread_t thread;
+    ASSERT_EQ(pthread_create(&thread, nullptr, RecordOnce, nullptr), 0);
+    while (g_stage != 1) ::usleep(1000);
+    if (const pid_t child = ::fork(); child == 0) {
+      ::alarm(10); // ends a hung child
+      oRegisterForLogs(nullptr);
+      ::_exit(0);
+    } else {
+      int status = 0;
+      ::waitpid(child, &status, 0);
+      EXPECT_TRUE(WIFEXITED(status)) << "the forked child hung";
+    }
+    pthread_cancel(thread);
+    g_stage = 2;
+    void *outcome = nullptr;
+    pthread_join(thread, &outcome);
+    EXPECT_EQ(outcome, PTHREAD_CANCELED) << type;
+    EXPECT_EQ(g_stage, type == PTHREAD_CANCEL_DEFERRED ? 3 : 2) << "the call returned";
+    EXPECT_NE(ReadFile(LogPath("g1")).value_or(""), "") << type;
+  }
 }
 
 // The platform layer on real files: a full disk takes part of a write, and
@@ -95,8 +126,9 @@ TEST_F(PosixTest, CancellingACallingThreadWaitsForTheCall) {
 TEST_F(PosixTest, PlatformCallsOnRealFiles) {
   std::filesystem::create_directories(where_.logs);
   std::int64_t size = -1;
-  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), size),
-                             second = os.open_log(LogPath("g1").c_str(), size);
+  platform::LockResult lock[2];
+  const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), lock[0], size),
+                             second = os.open_log(LogPath("g1").c_str(), lock[1], size);
   rlimit saved, full;
   ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
   full = saved, full.rlim_cur = 4;
@@ -106,27 +138,32 @@ TEST_F(PosixTest, PlatformCallsOnRealFiles) {
   ::setrlimit(RLIMIT_FSIZE, &saved);
   std::signal(SIGXFSZ, previous);
   EXPECT_EQ(os.file_size(first), 4);
-  EXPECT_EQ(os.try_lock_file(first), platform::LockResult::kLocked);
-  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kBusy);
-  os.unlock_file(first);
-  EXPECT_EQ(os.try_lock_file(second), platform::LockResult::kLocked);
+  using platform::LockMode;
+  using platform::LockResult;
+  EXPECT_EQ(os.try_lock_file(first, LockMode::kExclusive), LockResult::kBusy);
+  EXPECT_EQ(os.try_lock_file(second, LockMode::kExclusive), LockResult::kLocked)
+      << "a failed conversion holds none";
+  os.unlock_file(second);
+  EXPECT_EQ(os.try_lock_file(first, LockMode::kShared), LockResult::kLocked);
   EXPECT_TRUE(os.close_file(first) && os.close_file(second));
   const std::int64_t before = os.steady_milliseconds();
   os.sleep_milliseconds(30);
   EXPECT_GE(os.steady_milliseconds() - before, 25);
 }
 
-// Buffers that one large event grew past 1 MiB are given back when its call
-// ends (measured by glibc; a sanitizer's allocator reports nothing here).
+// Buffers that one large call grew past 1 MiB are given back when it ends
+// (measured by glibc; a sanitizer's allocator reports nothing here).
 TEST_F(PosixTest, LargeEventsGiveTheirBuffersBack) {
   ASSERT_EQ(oAnalyticsInit("g1", "u1"), 0);
   const auto in_use = [] {
     const struct mallinfo2 heap = ::mallinfo2();
     return heap.uordblks + heap.hblkhd;
   };
-  const std::string user(std::size_t{3} << 19, 'u'); // 1.5 MiB records, 3 MiB lines, the INIT line's too
+  const std::string large(std::size_t{3} << 19, 'x'); // 1.5 MiB records, 3 MiB lines, the INIT line's too
   const std::size_t before = in_use();
-  EXPECT_EQ(oAnalyticsGameEnter("g2", user.c_str()), 0);
+  EXPECT_EQ(oAnalyticsGameEnter("g2", large.c_str()), 0);
+  EXPECT_EQ(oAnalyticsGameEnter(large.c_str(), "u1"), -1); // a path no file may have
+  Captured().clear();
   EXPECT_LT(in_use(), before + (std::size_t{1} << 19));
 }
 

@@ -95,29 +95,60 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
 
 // Faults injected into single platform and cipher calls.
 const platform::Calls &Os() { return platform::native_calls(); }
+using platform::LockMode;
+using platform::LockResult;
 std::string g_logs;
+std::int64_t g_now_ms;
 // Another process makes the logs directory while this open fails.
-platform::FileHandle OpenRacingAnotherProcess(const char *path, std::int64_t &size) {
-  if (std::filesystem::exists(g_logs)) return Os().open_log(path, size);
+platform::FileHandle OpenRacingAnotherProcess(const char *path, LockResult &lock, std::int64_t &size) {
+  if (std::filesystem::exists(g_logs)) return Os().open_log(path, lock, size);
   std::filesystem::create_directories(g_logs);
   return platform::kNoFile;
 }
 bool ShortAppend(platform::FileHandle f, const void *d, std::size_t n) { // a full disk: a third goes in
   return Os().append(f, d, n / 3), false;
 }
+platform::FileHandle OpenWithUnknownSize(const char *path, LockResult &lock, std::int64_t &size) {
+  const platform::FileHandle f = Os().open_log(path, lock, size);
+  size = -1;
+  return f;
+}
+// Another writer records while this one writes: into an empty log, or one torn (g_tear), not yet cut back.
+bool g_tear;
+bool AnotherRecordsMeanwhile(platform::FileHandle f, const void *d, std::size_t n) {
+  platform::calls().append = Os().append;
+  if (g_tear) Os().append(f, d, n / 3);
+  oAnalyticsGameEnter("g1", "u1");
+  return !g_tear && Os().append(f, d, n);
+}
+void TearWhileAnotherRecords() { // the other writer's wait ends at the first reading of its deadline
+  g_tear = true;
+  platform::calls().append = AnotherRecordsMeanwhile;
+  platform::calls().steady_milliseconds = [] { return g_now_ms += 2000; };
+}
+void NoLocks(bool (*append)(platform::FileHandle, const void *, std::size_t)) {
+  platform::calls().open_log = [](const char *path, LockResult &lock, std::int64_t &size) {
+    const platform::FileHandle f = Os().open_log(path, lock, size);
+    lock = LockResult::kFailed;
+    return f;
+  };
+  platform::calls().try_lock_file = [](platform::FileHandle, LockMode) { return LockResult::kFailed; };
+  platform::calls().append = append;
+}
 // Another writer holds the lock past the wait; time moves 100 ms per reading
 // of the clock, however short the pauses.
 int g_lock_tries, g_pauses;
-std::int64_t g_now_ms;
-platform::LockResult BusyLock(platform::FileHandle) { return ++g_lock_tries, platform::LockResult::kBusy; }
-platform::LockResult RivalStartsTheLog(platform::FileHandle file) { // during the wait
+LockResult BusyLock(platform::FileHandle, LockMode) { return ++g_lock_tries, LockResult::kBusy; }
+LockResult RivalStartsTheLog(platform::FileHandle file, LockMode mode) { // at the first try, then gone
+  if (g_lock_tries++ > 0) return Os().try_lock_file(file, mode);
   std::int64_t size = 0;
-  const platform::FileHandle rival = Os().open_log((g_logs + "g1.log").c_str(), size);
+  LockResult lock;
+  const platform::FileHandle rival = Os().open_log((g_logs + "g1.log").c_str(), lock, size);
   if (size == 0) Os().append(rival, "rival-init", 10);
   Os().close_file(rival);
-  return BusyLock(file);
+  return LockResult::kBusy;
 }
-void InjectBusyLock(platform::LockResult (*lock)(platform::FileHandle)) {
+void InjectBusyLock(LockResult (*lock)(platform::FileHandle, LockMode)) {
   platform::calls().try_lock_file = lock;
   platform::calls().steady_milliseconds = [] { return g_now_ms += 100; };
   platform::calls().sleep_milliseconds = [](int) { ++g_pauses; };
@@ -130,42 +161,45 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     std::vector<std::string> records;
   };
   const Message open_failed = A(2, "ENTER", "log file failed to open. Maybe a bad game_id (g1)?"),
-                write_failed = A(2, "ENTER", "log file failed to write."), ok = A(0, "ENTER", "OK");
+                write_failed = A(2, "ENTER", "log file failed to write."), ok = A(0, "ENTER", "OK"),
+                init_ok = A(0, "INIT", "OK"), busy = A(2, "ENTER", "log file is locked by another process.");
   const Case cases[] = {
-      {"open fails", true, [] { platform::calls().open_log = [](const char *, std::int64_t &) { return platform::kNoFile; }; },
+      {"open fails", true, [] { platform::calls().open_log = [](const char *, LockResult &, std::int64_t &) { return platform::kNoFile; }; },
        -1, {open_failed}, {Rec("INIT")}},
       {"open fails while another process makes the directory: tried again", false,
        [] { std::filesystem::remove_all(g_logs), platform::calls().open_log = OpenRacingAnotherProcess; },
-       0, {kNeverInitialized, A(0, "INIT", "OK"), ok}, {Rec("INIT"), Rec("ENTER")}},
+       0, {kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER")}},
       {"storage cannot be made", false,
        [] { std::filesystem::remove_all(g_logs), platform::calls().make_directory = [](const char *) { return false; }; },
        -1, {A(0, "ENTER", "SDK was never initialized. Initializing the SDK."), {2, "[OrvaneSDK] Initialize() - failed."},
             open_failed}, {}},
       {"a log that exists empty starts with INIT", false, [] { WriteFile(g_logs + "g1.log", ""); },
-       0, {kNeverInitialized, A(0, "INIT", "OK"), ok}, {Rec("INIT"), Rec("ENTER")}},
-      {"write fails: the fragment stays apart", true, [] { platform::calls().append = ShortAppend; },
-       -1, {write_failed}, {Rec("INIT"), kTorn}},
+       0, {kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER")}},
+      {"write fails: the fragment stays apart, as a writer's death leaves one; later lines whole", true,
+       [] { platform::calls().append = ShortAppend; }, -1, {write_failed}, {Rec("INIT"), kTorn}},
       {"first write fails: cut back, so no log starts without INIT", false, [] { platform::calls().append = ShortAppend; },
        -1, {kNeverInitialized, A(2, "INIT", "log file failed to write."), write_failed}, {}},
+      {"... and no other writer can have written behind it meanwhile", false, TearWhileAnotherRecords,
+       -1, {busy, kNeverInitialized, A(2, "INIT", "log file failed to write."), write_failed}, {}},
       {"close fails", true, [] { platform::calls().close_file = [](platform::FileHandle f) { return Os().close_file(f) && false; }; },
        -1, {write_failed}, {Rec("INIT"), Rec("ENTER")}},
       {"cipher fails", true,
        [] { cipher::backend().encrypt = [](cipher::Session *, const std::uint8_t *, std::size_t, std::uint8_t *) { return std::ptrdiff_t{-1}; }; },
        -1, {A(2, "ENTER", "failed. Record encryption failed.")}, {Rec("INIT")}},
-      {"size unknown counts as not empty", false, [] { platform::calls().open_log = [](const char *path, std::int64_t &size) { const auto f = Os().open_log(path, size); return size = -1, f; }; },
-       0, {ok}, {kTorn, Rec("ENTER")}},
+      {"size unknown at the open", true, [] { platform::calls().open_log = OpenWithUnknownSize; },
+       -1, {write_failed}, {Rec("INIT")}},
+      {"size unknown under the lock", false,
+       [] { platform::calls().file_size = [](platform::FileHandle) { return std::int64_t{-1}; }; },
+       -1, {write_failed}, {}},
       {"empty log locked by another writer past the deadline", false, [] { InjectBusyLock(BusyLock); },
-       -1, {A(2, "ENTER", "log file is locked by another process.")}, {}},
+       -1, {busy}, {}},
       {"another writer starts the log during the wait: after a line break", false,
        [] { InjectBusyLock(RivalStartsTheLog); }, 0, {ok}, {kTorn, Rec("ENTER")}},
-      {"another writer starts the log before the lock is had", false,
-       [] { InjectBusyLock([](platform::FileHandle f) { return RivalStartsTheLog(f), Os().try_lock_file(f); }); },
-       0, {ok}, {kTorn, Rec("ENTER")}},
-      {"a file system without locks: the log starts all the same", false,
-       [] { platform::calls().try_lock_file = [](platform::FileHandle) { return platform::LockResult::kFailed; }; },
-       0, {kNeverInitialized, A(0, "INIT", "OK"), ok}, {Rec("INIT"), Rec("ENTER")}},
-      {"... and a torn first line stays: without the lock, cutting back could cut another writer's line", false,
-       [] { platform::calls().try_lock_file = [](platform::FileHandle) { return platform::LockResult::kFailed; }, platform::calls().append = ShortAppend; },
+      {"no locks: the log starts all the same; two writers finding it empty keep their lines apart", false,
+       [] { NoLocks(AnotherRecordsMeanwhile); },
+       0, {kNeverInitialized, init_ok, ok, kNeverInitialized, init_ok, ok},
+       {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
+      {"... a torn first line stays: cutting it may cut another's line", false, [] { NoLocks(ShortAppend); },
        -1, {kNeverInitialized, A(2, "INIT", "log file failed to write."), write_failed}, {kTorn}},
       {"an exception under the lock gives lock and file back", false,
        [] { platform::calls().append = [](platform::FileHandle, const void *, std::size_t) -> bool { throw std::bad_alloc(); }; },
@@ -182,6 +216,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     }
     Captured().clear();
     g_lock_tries = g_pauses = 0;
+    g_tear = false;
     {
       const CallsGuard restore;
       c.inject();
@@ -194,6 +229,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     Captured().clear(); // and the recorder is whole again
     EXPECT_EQ(oAnalyticsGameExit("g1", "u1"), 0);
     EXPECT_EQ(Captured().back(), A(0, "EXIT", "OK"));
+    EXPECT_EQ(Log().back(), Rec("EXIT"));
   }
 }
 

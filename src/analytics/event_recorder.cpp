@@ -53,7 +53,8 @@ constexpr int kLockPauseMilliseconds = 5;
 // What one recording works in besides its arguments. Each call takes one of
 // its own, so that threads never wait for each other: two recordings meet
 // only in the file system, where O_APPEND keeps lines whole and the file
-// lock keeps one INIT line per log, between threads as between processes.
+// lock keeps one INIT line first in each log, between threads as between
+// processes.
 struct Workspace {
   std::string path;
   std::string record;
@@ -86,6 +87,7 @@ struct WorkspaceLease {
     space = new Workspace;
   }
   ~WorkspaceLease() {
+    Trim(space->path); // a refused game id may be as long as the host likes
     Trim(space->record);
     Trim(space->line);
     Trim(space->init_line);
@@ -105,8 +107,12 @@ struct WorkspaceLease {
 // an exception included: a leaked handle would keep the lock held.
 struct LogFile {
   platform::FileHandle handle = platform::kNoFile;
-  std::int64_t size = -1;
-  bool locked = false;
+  std::int64_t size = -1; // measured under `lock` when it is kLocked
+  // The shared lock while the call appends, exclusive while it starts the
+  // log; kBusy while it holds none yet, kFailed where the file system has no
+  // locks.
+  platform::LockResult lock = platform::LockResult::kFailed;
+  bool exclusive = false;
 
   LogFile() = default;
   LogFile(const LogFile &) = delete;
@@ -115,10 +121,13 @@ struct LogFile {
     if (handle != platform::kNoFile) Close();
   }
   // True when everything written reached the file.
+  // The shared lock goes with the handle, so the common event pays no call
+  // for it; the exclusive one is given back first, so that a child forked
+  // meanwhile cannot keep other writers from the log.
   bool Close() {
     const platform::Calls &os = platform::calls();
-    if (locked) os.unlock_file(handle);
-    locked = false;
+    if (exclusive) os.unlock_file(handle);
+    exclusive = false;
     const bool closed = os.close_file(handle);
     handle = platform::kNoFile;
     return closed;
@@ -163,15 +172,17 @@ void OpenLog(MessageBatch &messages, const Event &event, const std::string &path
   const platform::Calls &os = platform::calls();
   const std::string &logs = Storage().logs;
   const bool usable = IsUsableGameId(event.game_id) && !logs.empty();
-  if (usable) log.handle = os.open_log(path.c_str(), log.size);
+  if (usable) log.handle = os.open_log(path.c_str(), log.lock, log.size);
   if (log.handle != platform::kNoFile) return;
   if (!DirectoryExists(logs.c_str())) {
     messages.Add(LogLevel::Info, event.type.sdk_not_initialized);
     InitializeStorage(messages);
+  } else if (usable) {
+    MendStorage();
   }
   // Whoever made the directory (this call, or another process starting at the
   // same moment), the open is worth one more try once it is there.
-  if (usable && DirectoryExists(logs.c_str())) log.handle = os.open_log(path.c_str(), log.size);
+  if (usable && DirectoryExists(logs.c_str())) log.handle = os.open_log(path.c_str(), log.lock, log.size);
   if (log.handle == platform::kNoFile) {
     std::string text = event.type.open_failed;
     AppendPrintable(text, event.game_id);
@@ -180,23 +191,38 @@ void OpenLog(MessageBatch &messages, const Event &event, const std::string &path
   }
 }
 
-// Waits for the log's lock until a deadline on the steady clock: a count of
-// pauses would not bound the time, since signals cut pauses short and
-// Windows stretches them to its timer tick. This is the only lock a
-// recording takes, and it is given back before the call's messages go to
-// the host, so a callback may record again (src/README.md, "Locks").
-// False when another writer held it past the deadline; true when this call
-// holds it, or when the file system offers no lock (nothing can keep other
-// writers out there, and refusing would leave the log without events).
+// Takes the lock this call writes under, waiting until a deadline on the
+// steady clock: a count of pauses would not bound the time, since signals
+// cut pauses short and Windows stretches them to its timer tick. A log is
+// appended to under the shared lock and started only under the exclusive
+// one, which is had once the log is seen empty: so the writer that starts a
+// log meets no other writer, and the first line it cuts back when it went in
+// torn cannot take another's line with it. The size is taken again whenever a
+// lock is newly had. This is the only lock a recording takes, and it is
+// given back before the call's messages go to the host, so a callback may
+// record again (src/README.md, "Locks"). False when other writers kept the
+// log past the deadline; true also where the file system offers no lock
+// (nothing can keep other writers out there, and refusing would leave the
+// log without events).
 bool LockWithinDeadline(LogFile &log) {
   const platform::Calls &os = platform::calls();
   const std::int64_t deadline = os.steady_milliseconds() + kLockWaitMilliseconds;
   for (;;) {
-    switch (os.try_lock_file(log.handle)) {
-    case platform::LockResult::kLocked: return log.locked = true;
-    case platform::LockResult::kFailed: return true;
-    case platform::LockResult::kBusy: break;
+    if (log.lock == platform::LockResult::kFailed || log.exclusive) return true;
+    if (log.lock == platform::LockResult::kLocked) {
+      if (log.size != 0) return true;
+      log.lock = os.try_lock_file(log.handle, platform::LockMode::kExclusive);
+      log.exclusive = log.lock == platform::LockResult::kLocked;
+    } else {
+      // Another writer holds the log to start it: this one waits for its
+      // outcome, or, while writers hold it shared, for a moment to start it.
+      log.lock = os.try_lock_file(log.handle, platform::LockMode::kShared);
     }
+    if (log.lock == platform::LockResult::kLocked) {
+      log.size = os.file_size(log.handle);
+      continue;
+    }
+    if (log.lock == platform::LockResult::kFailed) return true;
     if (os.steady_milliseconds() >= deadline) return false;
     os.sleep_milliseconds(kLockPauseMilliseconds);
   }
@@ -233,13 +259,25 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   LogFile log;
   OpenLog(messages, event, space.path, log);
   if (log.handle == platform::kNoFile) return -1;
+  // Another writer holds the log to start it, or the log is empty: the size
+  // that decides this call is the one taken under the lock it writes under.
+  const bool waits =
+      log.lock == platform::LockResult::kBusy || (log.lock == platform::LockResult::kLocked && log.size == 0);
+  if (waits && !LockWithinDeadline(log)) {
+    messages.Add(LogLevel::Error, type.locked_out);
+    return -1;
+  }
+  // A size that cannot be taken tells nothing of whether the log has its INIT
+  // line: nothing is written.
+  if (log.size < 0) {
+    messages.Add(LogLevel::Error, type.write_failed);
+    return -1;
+  }
   if (is_init && log.size != 0) {
     messages.Add(LogLevel::Warning, type.already_initialized);
     return 0;
   }
 
-  // The line is ready before the lock is taken: the lock then covers only
-  // measuring the file again and writing, however slow the cipher is.
   const std::string_view time = space.clock.At(os.now_seconds());
   space.line.clear();
   if (!is_init) space.line = platform::line_break();
@@ -248,45 +286,34 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
     return -1;
   }
 
-  // An empty log is the one moment two writers could both start it, so only
-  // then is the file locked; its size is taken again whatever the wait gave,
-  // since another writer may have started it meanwhile.
-  if (log.size == 0) {
-    const bool may_start = LockWithinDeadline(log);
-    log.size = os.file_size(log.handle);
-    if (log.size == 0 && !may_start) {
-      messages.Add(LogLevel::Error, type.locked_out);
-      return -1;
-    }
-    if (is_init && log.size != 0) {
-      messages.Add(LogLevel::Warning, type.already_initialized);
-      return 0;
-    }
-  }
-
-  // Only a call that holds the lock and has just found the log empty writes
-  // without a line break in front; a first event writes the INIT line and its
-  // own in one write, so that no log ever starts with anything else.
+  // A first event writes the INIT line and its own in one write, so that no
+  // log ever starts with anything else. Where no lock keeps other writers
+  // out, two may both find the log empty: each then puts a line break in
+  // front, so that their lines cannot run together (readers skip the empty
+  // line).
   const bool starts_log = log.size == 0;
   const bool init_first = starts_log && !is_init;
   std::string_view bytes = space.line;
-  if (init_first) {
-    messages.Add(LogLevel::Warning, type.log_not_initialized);
+  if (starts_log && (init_first || !log.exclusive)) {
     space.init_line.clear();
-    if (const Encoded encoded = EncodeLine(space, event, kInitEvent, time, space.init_line);
-        encoded != Encoded::kLine) {
-      messages.Add(LogLevel::Error, EncodeFailure(kInitEvent, encoded));
-      messages.Add(LogLevel::Error, EncodeFailure(type, encoded));
-      return -1;
+    if (!log.exclusive) space.init_line = platform::line_break();
+    if (init_first) {
+      messages.Add(LogLevel::Warning, type.log_not_initialized);
+      if (const Encoded encoded = EncodeLine(space, event, kInitEvent, time, space.init_line);
+          encoded != Encoded::kLine) {
+        messages.Add(LogLevel::Error, EncodeFailure(kInitEvent, encoded));
+        messages.Add(LogLevel::Error, EncodeFailure(type, encoded));
+        return -1;
+      }
     }
     space.init_line += space.line;
     bytes = space.init_line;
   }
   bool written = os.append(log.handle, bytes.data(), bytes.size());
   // A torn first line would leave the log without a readable INIT line for
-  // good; it is cut away while the lock still keeps other writers out. Later
-  // lines are never cut: without the lock that could cut another's line.
-  if (!written && starts_log && log.locked) os.truncate_file(log.handle, 0);
+  // good; it is cut away while the exclusive lock keeps every other writer
+  // out. Later lines are never cut: others may have written behind them.
+  if (!written && starts_log && log.exclusive) os.truncate_file(log.handle, 0);
   written = log.Close() && written;
   if (!written) {
     if (init_first) messages.Add(LogLevel::Error, kInitEvent.write_failed);

@@ -13,8 +13,7 @@ namespace orvane {
 // exhausted, say), the call reports `failure_message` at Error level and
 // returns `failure` instead: no exception ever reaches the host.
 template <class Result, class Work>
-Result RunExport(Result failure, const char *failure_message, Work &&work) noexcept {
-  const platform::CancellationOff uncancellable;
+Result RunUncancellable(Result failure, const char *failure_message, Work &&work) noexcept {
   MessageBatch messages;
   Result result = failure;
   try {
@@ -24,6 +23,18 @@ Result RunExport(Result failure, const char *failure_message, Work &&work) noexc
     messages.Add(LogLevel::Error, failure_message);
   }
   messages.Deliver();
+  return result;
+}
+
+// The same with the thread kept from being cancelled meanwhile. Not noexcept,
+// nor are the exports that call it: an asynchronous cancellation that arrived
+// during the call acts when the caller's setting comes back, and unwinds the
+// thread through these frames to the game's.
+template <class Result, class Work>
+Result RunExport(Result failure, const char *failure_message, Work &&work) {
+  const int cancellation = platform::DisableCancellation();
+  const Result result = RunUncancellable(failure, failure_message, std::forward<Work>(work));
+  platform::RestoreCancellation(cancellation);
   return result;
 }
 

@@ -6,8 +6,9 @@
 extern "C" {
 
 ORVANE_API void ORVANE_CALL oRegisterForLogs(OrvaneLogCallback callback) {
-  const orvane::platform::CancellationOff uncancellable;
+  const int cancellation = orvane::platform::DisableCancellation();
   orvane::RegisterForLogs(callback);
+  orvane::platform::RestoreCancellation(cancellation);
 }
 
 ORVANE_API void ORVANE_CALL oInitialize(void) {

@@ -40,8 +40,10 @@ void InitializeStorage(MessageBatch &messages) {
       // when missing, like a fresh account's ~/.local/share.
       if (!where.base.empty() && !DirectoryExists(where.base.c_str()))
         os.make_private_directories(where.base.c_str());
-      if (!where.root.empty()) os.make_directory(where.root.c_str());
     }
+    // Also when the root is there: it may be one that an earlier run left
+    // without its owner's rights, in which no logs directory can be made.
+    if (!where.root.empty()) os.make_directory(where.root.c_str());
     if (!where.logs.empty()) os.make_directory(where.logs.c_str());
     // Report what the disk shows, not what was attempted: a creation that
     // failed must not read as success.
@@ -51,6 +53,13 @@ void InitializeStorage(MessageBatch &messages) {
     }
   }
   messages.Add(LogLevel::Info, "[OrvaneSDK] Initialize() - OK.");
+}
+
+void MendStorage() {
+  const platform::StorageLocation &where = Storage();
+  const platform::Calls &os = platform::calls();
+  if (!where.root.empty()) os.make_directory(where.root.c_str());
+  if (!where.logs.empty()) os.make_directory(where.logs.c_str());
 }
 
 } // namespace orvane

@@ -19,5 +19,8 @@ bool DirectoryExists(const char *path);
 // "Initialize() - OK." or, when the logs directory is still missing,
 // "Initialize() - failed." to `messages`.
 void InitializeStorage(MessageBatch &messages);
+// Gives the root and logs directories their owner-only mode back, for a log
+// that could not be opened though the logs directory is there.
+void MendStorage();
 
 } // namespace orvane

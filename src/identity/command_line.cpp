@@ -47,8 +47,9 @@ std::string FindValueAfterMarker(const platform::ArgumentList &args, std::string
 char *LookUpIdentity(MessageBatch &messages, const IdentityLookup &lookup) {
   char *const empty = const_cast<char *>(kEmptyText);
   platform::ArgumentList args;
-  if (!platform::calls().argument_list(args)) return empty;
-  const std::string value = FindValueAfterMarker(args, lookup.marker);
+  // A command line that cannot be read (no /proc) holds no value either.
+  const bool read = platform::calls().argument_list(args);
+  const std::string value = read ? FindValueAfterMarker(args, lookup.marker) : std::string();
   // A value whose first byte is zero would read as empty text in a block
   // that the host must free, while an empty result must never be freed:
   // such a value counts as not found, so that the rule stays exact.

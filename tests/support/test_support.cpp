@@ -61,6 +61,7 @@ std::vector<std::string> Records(const std::string &log, const std::string &key_
   const std::string content = ReadFile(log).value_or("");
   if (content.empty()) return records;
   for (const std::string &line : Split(content, platform::line_break())) {
+    if (line.empty()) continue; // as the reader skips it: where no lock is, a log may start with one
     const std::optional<std::string> plain = DecryptLine(line, key_text);
     records.push_back(plain ? std::regex_replace(*plain, time, "\"time\":\"T\"") : "(undecryptable)");
   }

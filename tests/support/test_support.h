@@ -31,7 +31,7 @@ void WriteFile(const std::string &path, std::string_view bytes);
 std::vector<std::string> Split(std::string_view text, std::string_view separator);
 
 // The lines of a log (platform line breaks), each decrypted with its time
-// stamp replaced by "T", or "(undecryptable)"; none for a missing or empty log.
+// stamp replaced by "T", or "(undecryptable)"; empty lines skipped.
 std::vector<std::string> Records(const std::string &log, const std::string &key_text);
 inline std::string KeyString(const KeyText &key_text) {
   return std::string(key_text.begin(), key_text.end());

@@ -19,21 +19,26 @@ TEST_F(WindowsTest, DirectoryExistsWithOrWithoutTrailingSeparator) {
 }
 
 // A device or a directory is no log. Two handles of one log, as two games hold
-// them: Windows' byte-range locks are mandatory, yet the lock must not stop an
-// append, and a torn line is cut back through an append-only handle (wine
-// enforces neither rule, so only real Windows sees those two faults).
+// them, both shared; a conversion gives the shared lock up first. Windows'
+// byte-range locks are mandatory, yet the lock must not stop an append, and a
+// torn line is cut back through an append-only handle (wine enforces neither
+// rule, so only real Windows sees those two faults).
 TEST_F(WindowsTest, LogHandles) {
   const std::string path = base_ + "\\two.log";
   std::int64_t size = -1;
-  EXPECT_EQ(os.open_log("NUL", size), platform::kNoFile) << "a device is no log";
-  EXPECT_EQ(os.open_log(base_.c_str(), size), platform::kNoFile) << "a directory is no log";
-  const platform::FileHandle one = os.open_log(path.c_str(), size), two = os.open_log(path.c_str(), size);
+  platform::LockResult lock[2];
+  EXPECT_EQ(os.open_log("NUL", lock[0], size), platform::kNoFile) << "a device is no log";
+  EXPECT_EQ(os.open_log(base_.c_str(), lock[0], size), platform::kNoFile) << "a directory is no log";
+  const platform::FileHandle one = os.open_log(path.c_str(), lock[0], size),
+                             two = os.open_log(path.c_str(), lock[1], size);
   ASSERT_TRUE(one != platform::kNoFile && two != platform::kNoFile);
-  EXPECT_EQ(os.try_lock_file(one), platform::LockResult::kLocked);
-  EXPECT_EQ(os.try_lock_file(two), platform::LockResult::kBusy);
+  using platform::LockMode;
+  const platform::LockResult locked = platform::LockResult::kLocked, busy = platform::LockResult::kBusy;
+  EXPECT_EQ(os.try_lock_file(one, LockMode::kExclusive), busy);
+  EXPECT_EQ(os.try_lock_file(two, LockMode::kExclusive), locked) << "the failed conversion held none";
   EXPECT_TRUE(os.append(two, "ab", 2) && os.append(one, "cd", 2)); // "cd" behind "ab", not over it
-  os.unlock_file(one);
-  EXPECT_EQ(os.try_lock_file(two), platform::LockResult::kLocked);
+  os.unlock_file(two);
+  EXPECT_EQ(os.try_lock_file(one, LockMode::kShared), locked);
   EXPECT_TRUE(os.truncate_file(one, 3));
   EXPECT_EQ(ReadFile(path), "abc");
   EXPECT_TRUE(os.close_file(one) && os.close_file(two));

@@ -18,12 +18,15 @@
 namespace orvane::platform {
 namespace {
 
-// stat and fstat as the system calls themselves: glibc's functions of those
+// stat, lstat and fstat as the system calls themselves: glibc's functions of those
 // names have glibc 2.33's version, which older systems refuse to load. On
 // 64-bit Linux the kernel fills the very struct stat of <sys/stat.h>.
 static_assert(sizeof(long) == 8, "the kernel's struct stat is glibc's on 64-bit Linux only");
 int StatPath(const char *path, struct stat &st) {
   return static_cast<int>(::syscall(SYS_newfstatat, AT_FDCWD, path, &st, 0));
+}
+int StatLink(const char *path, struct stat &st) {
+  return static_cast<int>(::syscall(SYS_newfstatat, AT_FDCWD, path, &st, AT_SYMLINK_NOFOLLOW));
 }
 int StatOpenFile(int fd, struct stat &st) { return static_cast<int>(::syscall(SYS_fstat, fd, &st)); }
 
@@ -34,22 +37,45 @@ bool DirectoryExistsPosix(const char *path) {
 
 // Owner-only whatever the umask: another local user must not be able to
 // plant links or FIFOs where the logs go, or read logs whose key follows from
-// their names.
-bool MakeDirectoryPosix(const char *path) { return ::mkdir(path, 0700) == 0; }
+// their names. The mode is set after mkdir, which the umask narrows (0177
+// would leave a folder nothing can be made in); a folder of ours that an
+// earlier run left so is mended, a link at its place is left alone.
+bool MakeDirectoryPosix(const char *path) {
+  if (::mkdir(path, 0700) != 0 && errno != EEXIST) return false;
+  struct stat st;
+  if (StatLink(path, st) != 0 || !S_ISDIR(st.st_mode)) return false;
+  return (st.st_mode & 07777) == 0700 || ::chmod(path, 0700) == 0;
+}
 
 bool MakePrivateDirectoriesPosix(const char *path) {
   const std::string_view whole(path);
   // Create each missing level from the top, so that a missing parent of the
-  // data directory gets the same owner-only mode.
+  // data directory gets the same owner-only mode; levels that exist are the
+  // account's own and keep theirs.
   for (std::size_t end = 0; end != std::string_view::npos;) {
     end = whole.find('/', end + 1);
     const std::string level(whole.substr(0, end));
-    if (::mkdir(level.c_str(), 0700) != 0 && errno != EEXIST) return false;
+    if (::mkdir(level.c_str(), 0700) == 0) {
+      ::chmod(level.c_str(), 0700);
+    } else if (errno != EEXIST) {
+      return false;
+    }
   }
   return DirectoryExistsPosix(path);
 }
 
-FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
+LockResult TryLockFilePosix(FileHandle file, LockMode mode) {
+  // flock, not fcntl: an flock belongs to the open file description, so two
+  // opens of one log in this process exclude each other as two processes do,
+  // and closing another descriptor of the file does not drop it. Linux
+  // converts a held lock by dropping it first, so a failed conversion holds
+  // none and two writers converting at once cannot wait for each other.
+  const int operation = mode == LockMode::kShared ? LOCK_SH : LOCK_EX;
+  if (::flock(static_cast<int>(file), operation | LOCK_NB) == 0) return LockResult::kLocked;
+  return errno == EWOULDBLOCK || errno == EINTR ? LockResult::kBusy : LockResult::kFailed;
+}
+
+FileHandle OpenLogPosix(const char *path, LockResult &lock, std::int64_t &size) {
   // O_NOFOLLOW: a link at the log path would let the library write anywhere
   // the game may. O_NONBLOCK: opening a FIFO must not hang the game.
   int fd;
@@ -57,22 +83,36 @@ FileHandle OpenLogPosix(const char *path, std::int64_t &size) {
     fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600);
   } while (fd < 0 && errno == EINTR);
   if (fd < 0) return kNoFile;
+  lock = TryLockFilePosix(fd, LockMode::kShared);
+  // The size comes from seeking to the end, which costs a fraction of fstat
+  // and refuses a FIFO or a terminal by itself. Only what reads as empty (a
+  // new log, or a device such as /dev/null) has its type examined; a block
+  // device, which only root can place, would pass.
+  const off_t end = ::lseek(fd, 0, SEEK_END);
+  if (end < 0 && errno == ESPIPE) {
+    ::close(fd);
+    return kNoFile;
+  }
+  size = end < 0 ? -1 : end;
+  if (end != 0) return fd;
   struct stat st;
   if (StatOpenFile(fd, st) != 0) {
     size = -1;
   } else if (!S_ISREG(st.st_mode)) {
     ::close(fd);
     return kNoFile;
-  } else {
-    size = st.st_size;
+  } else if ((st.st_mode & 07777) != 0600) {
+    // A new log gets the mode the umask may have narrowed (0400 under 0277
+    // would refuse the next open).
+    ::fchmod(fd, 0600);
   }
   return fd;
 }
 
 std::int64_t FileSizePosix(FileHandle file) {
-  struct stat st;
-  if (StatOpenFile(static_cast<int>(file), st) != 0) return -1;
-  return st.st_size;
+  // The end of an append-only file is where every write lands anyway.
+  const off_t end = ::lseek(static_cast<int>(file), 0, SEEK_END);
+  return end < 0 ? -1 : end;
 }
 
 bool AppendPosix(FileHandle file, const void *data, std::size_t size) {
@@ -98,14 +138,6 @@ bool CloseFilePosix(FileHandle file) {
   // On Linux the descriptor is released even when close reports EINTR, so it
   // is never retried.
   return ::close(static_cast<int>(file)) == 0;
-}
-
-LockResult TryLockFilePosix(FileHandle file) {
-  // flock, not fcntl: an flock belongs to the open file description, so two
-  // opens of one log in this process exclude each other as two processes do,
-  // and closing another descriptor of the file does not drop it.
-  if (::flock(static_cast<int>(file), LOCK_EX | LOCK_NB) == 0) return LockResult::kLocked;
-  return errno == EWOULDBLOCK || errno == EINTR ? LockResult::kBusy : LockResult::kFailed;
 }
 
 void UnlockFilePosix(FileHandle file) { ::flock(static_cast<int>(file), LOCK_UN); }
@@ -200,7 +232,14 @@ StorageLocation default_storage_location() {
 
 std::string_view line_break() { return "\n"; }
 
-CancellationOff::CancellationOff() { ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &previous); }
-CancellationOff::~CancellationOff() { ::pthread_setcancelstate(previous, nullptr); }
+int DisableCancellation() noexcept {
+  int previous = PTHREAD_CANCEL_ENABLE;
+  ::pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &previous);
+  return previous;
+}
+
+void RestoreCancellation(int previous) { ::pthread_setcancelstate(previous, nullptr); }
+
+void RunInForkedChildren(void (*reset)()) { ::pthread_atfork(nullptr, nullptr, reset); }
 
 } // namespace orvane::platform

@@ -27,7 +27,9 @@ bool DirectoryExistsWindows(const char *path) {
   return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
 }
 
-bool MakeDirectoryWindows(const char *path) { return ::_mkdir(path) == 0; }
+bool MakeDirectoryWindows(const char *path) {
+  return ::_mkdir(path) == 0 || (errno == EEXIST && DirectoryExistsWindows(path));
+}
 
 bool IsSeparator(char c) { return c == '\\' || c == '/'; }
 
@@ -46,7 +48,10 @@ bool MakePrivateDirectoriesWindows(const char *path) {
   return DirectoryExistsWindows(path);
 }
 
-FileHandle OpenLogWindows(const char *path, std::int64_t &size) {
+LockResult TryLockFileWindows(FileHandle file, LockMode mode);
+bool CloseFileWindows(FileHandle file);
+
+FileHandle OpenLogWindows(const char *path, LockResult &lock, std::int64_t &size) {
   // Append data without write data: the system places every WriteFile at the
   // end of the file at that moment, so lines of concurrent writers never
   // overwrite each other. Read data is there for the byte-range lock, read
@@ -65,10 +70,11 @@ FileHandle OpenLogWindows(const char *path, std::int64_t &size) {
     ::CloseHandle(file);
     return kNoFile;
   }
+  lock = TryLockFileWindows(reinterpret_cast<FileHandle>(file), LockMode::kShared);
   if (!::GetFileInformationByHandle(file, &info)) {
     size = -1;
   } else if ((info.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0) {
-    ::CloseHandle(file);
+    CloseFileWindows(reinterpret_cast<FileHandle>(file));
     return kNoFile;
   } else {
     size =
@@ -104,8 +110,6 @@ bool TruncateFileWindows(FileHandle file, std::int64_t size) {
   return cut;
 }
 
-bool CloseFileWindows(FileHandle file) { return ::CloseHandle(AsHandle(file)) != 0; }
-
 // Byte-range locks on Windows are mandatory: a write into a locked range
 // fails. The lock therefore covers one byte far beyond any real file size,
 // where no append ever lands; it only serves as a token between processes.
@@ -118,18 +122,30 @@ OVERLAPPED LockRange() {
   return where;
 }
 
-LockResult TryLockFileWindows(FileHandle file) {
-  // A lock belongs to its handle, so two handles of one process exclude each
-  // other as two processes do.
-  OVERLAPPED where = LockRange();
-  if (::LockFileEx(AsHandle(file), LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0, &where))
-    return LockResult::kLocked;
-  return ::GetLastError() == ERROR_LOCK_VIOLATION ? LockResult::kBusy : LockResult::kFailed;
-}
-
 void UnlockFileWindows(FileHandle file) {
   OVERLAPPED where = LockRange();
   ::UnlockFileEx(AsHandle(file), 0, 1, 0, &where);
+}
+
+LockResult TryLockFileWindows(FileHandle file, LockMode mode) {
+  // A lock belongs to its handle, so two handles of one process exclude each
+  // other as two processes do. Windows converts no lock, and its own shared
+  // lock would refuse the exclusive one: it is given back first, as Linux
+  // does, so a failed conversion holds none.
+  if (mode == LockMode::kExclusive) UnlockFileWindows(file);
+  const DWORD flags =
+      LOCKFILE_FAIL_IMMEDIATELY | (mode == LockMode::kExclusive ? LOCKFILE_EXCLUSIVE_LOCK : 0);
+  OVERLAPPED where = LockRange();
+  if (::LockFileEx(AsHandle(file), flags, 0, 1, 0, &where)) return LockResult::kLocked;
+  return ::GetLastError() == ERROR_LOCK_VIOLATION ? LockResult::kBusy : LockResult::kFailed;
+}
+
+bool CloseFileWindows(FileHandle file) {
+  // Windows gives the locks of a closed handle back only when it gets to it;
+  // a starting writer must not wait for that. Unlocking a handle that holds
+  // no lock merely fails.
+  UnlockFileWindows(file);
+  return ::CloseHandle(AsHandle(file)) != 0;
 }
 
 std::int64_t NowSecondsWindows() { return static_cast<std::int64_t>(::_time64(nullptr)); }
@@ -186,8 +202,10 @@ StorageLocation default_storage_location() {
 
 std::string_view line_break() { return "\r\n"; }
 
-// Windows threads are not cancelled from outside the way POSIX threads are.
-CancellationOff::CancellationOff() : previous(0) {}
-CancellationOff::~CancellationOff() = default;
+// Windows threads are not cancelled from outside the way POSIX threads are,
+// and Windows processes do not fork.
+int DisableCancellation() noexcept { return 0; }
+void RestoreCancellation(int) {}
+void RunInForkedChildren(void (*)()) {}
 
 } // namespace orvane::platform
