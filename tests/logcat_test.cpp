@@ -4,10 +4,15 @@
 #include "help_text.h"
 #include "key_discovery.h"
 #include "logformat/hex.h"
+#include "logformat/key_text.h"
+#include "record_filter.h"
 #include "support/test_support.h"
 #include "valid_utf8.h"
 
+#include <filesystem>
 #include <thread>
+
+#include <unistd.h>
 
 namespace orvane::logcat {
 namespace {
@@ -21,9 +26,11 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
       {"{\"user_id\":\"a\\\"b\xff\x80\",\"game_id\":\"c\\\\d\",\"type\":\"j\xc3\xa9u\",\"time\":\"t\","
        R"("extra":"\b\f\n\r\t\u0001\u0000)" "\x7f\"}", // every escape the library writes; raw bytes
        {"a\"b\xff\x80", "c\\d", "j\xc3\xa9u", "t", std::string("\b\f\n\r\t\x01\0\x7f", 8)}},
-      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\\ud800\\udc00\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
+      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\\ud800\\udc00\",\t"
+       "\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
        "\"game_id\":\"g\",\"user_id\":\"\\uDBFF\\uDFFF\" } ", // other writers' forms
-       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9\xf0\x90\x80\x80"}}};
+       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80",
+        "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9\xf0\x90\x80\x80"}}};
   const std::string h = R"({"user_id":"u","game_id":"g","type":"T","time":"t")", refused[] = {
       "", "{}", h + "}", h + R"(,"extra":"x")", h + R"(,"extra":"x"}})", h + R"(,"user_id":"x"})",
       h + R"(,"extra":1})", h + R"(,"Extra":"x"})", h + R"(,"extra" "x"})", h + R"(,"extra":"x",})",
@@ -38,13 +45,24 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
 
 // Valid UTF-8 is copied; a byte alone, overlong, of a surrogate, above U+10FFFF or cut short is escaped.
 TEST(ValidUtf8, EscapesExactlyTheBytesNotPartOfUtf8) {
-  const std::string valid = "\xc2\x80\xdf\xbf\xe0\xa0\x80\xed\x9f\xbf\xf0\x90\x80\x80\xf4\x8f\xbf\xbf";
-  const std::string bad = "\x80\xbf\xc0\xaf\xc1\xbf\xe0\x9f\xbf\xf0\x8f\xbf\xbf\xed\xa0\x80\xf4\x90\x80\x80";
-  const std::string escaped = R"(\u0080\u00bf\u00c0\u00af\u00c1\u00bf\u00e0\u009f\u00bf\u00f0\u008f\u00bf)"
-                              R"(\u00bf\u00ed\u00a0\u0080\u00f4\u0090\u0080\u0080\u00f5\u00fe\u00ff a\u00e2)";
-  std::string out = "kept";
-  EXPECT_EQ(AppendValidUtf8(out, valid + bad + "\xf5\xfe\xff a\xe2\x82x\xc3 eight ok\xe9\xc3\xa9\xe9"), 28u);
-  EXPECT_EQ(out, "kept" + valid + escaped + "\\u0082x\\u00c3 eight ok\\u00e9\xc3\xa9\\u00e9");
+  const std::pair<std::string, std::string> cases[] = {
+      {"\xc2\x80\xdf\xbf", "\xc2\x80\xdf\xbf"},                                 // two bytes, first and last
+      {"\xe0\xa0\x80\xed\x9f\xbf", "\xe0\xa0\x80\xed\x9f\xbf"},                 // three, to the surrogates
+      {"\xf0\x90\x80\x80\xf4\x8f\xbf\xbf", "\xf0\x90\x80\x80\xf4\x8f\xbf\xbf"}, // four, to U+10FFFF
+      {"\x80\xbf", R"(\u0080\u00bf)"},                                          // continuations alone
+      {"\xc0\xaf\xc1\xbf", R"(\u00c0\u00af\u00c1\u00bf)"},                      // overlong in two bytes
+      {"\xe0\x9f\xbf\xf0\x8f\xbf", R"(\u00e0\u009f\u00bf\u00f0\u008f\u00bf)"},  // in three and four
+      {"\xed\xa0\x80", R"(\u00ed\u00a0\u0080)"},                                // a surrogate
+      {"\xf4\x90\x80\x80", R"(\u00f4\u0090\u0080\u0080)"},                      // above U+10FFFF
+      {"\xf5\xfe\xff", R"(\u00f5\u00fe\u00ff)"},                                // never in UTF-8
+      {"a\xe2\x82x\xc3 b", R"(a\u00e2\u0082x\u00c3 b)"},                        // cut short
+      {"\xe9\xc3\xa9\xe9", "\\u00e9\xc3\xa9\\u00e9"}};                          // alone beside a valid one
+  for (const auto &[bytes, printed] : cases) {
+    std::string out = "kept";
+    const std::size_t escaped = AppendValidUtf8(out, bytes);
+    EXPECT_EQ(out, "kept" + printed) << printed;
+    EXPECT_EQ(escaped, (printed.size() - bytes.size()) / 5) << printed; // an escape is five bytes more
+  }
 }
 
 std::size_t g_count = 0;
@@ -52,12 +70,17 @@ std::size_t g_count = 0;
 TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   TakeKeyText("g1"); // the library encrypts every line of this process under g1
   RecordCipher cipher;
-  auto encrypt = [&](std::string_view t, std::string h = "") { return EncryptRecordText(cipher, t, h), h; };
+  auto encrypt = [&](std::string_view text) {
+    std::string hex;
+    EncryptRecordText(cipher, text, hex);
+    return hex;
+  };
   const std::string good = encrypt(R"({"user_id":"u","game_id":"g","type":"T","time":"t","extra":""})");
   const std::vector<std::string> first = {"g1", "g2", "g3"}, last = {"g2", "g3", "g1"};
   CallsGuard guard;
   cipher::backend().decrypt = [](cipher::Session *s, const std::uint8_t *in, std::size_t n, std::uint8_t *o) {
-    return ++g_count, cipher::native_backend().decrypt(s, in, n, o);
+    ++g_count;
+    return cipher::native_backend().decrypt(s, in, n, o);
   };
   KeyPool pool;
   LineBuffers buf;
@@ -69,7 +92,7 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
       {good.substr(0, 32), {first, 1}, F::kBadPadding, 1, 3}, // its first block alone
       {encrypt(R"({"user_id":"u"})"), {last, 1}, F::kNotRecord, 1, 3}, {"", {first}, F::kNotBlocks, 0, 0},
       {good.substr(8), {first}, F::kNotBlocks, 0, 0}, {"x", {first}, F::kNotHex, 0, 0},
-      {good.substr(0, 10) + "g" + good.substr(11), {first}, F::kNotHex, 0, 0}};
+      {good.substr(0, 10) + "g" + good.substr(11), {first}, F::kNotHex, 0, 0}, {good, {}, F::kBadPadding, 0, 0}};
   for (auto c : cases) // braces: ReadLine runs before the winner and the count are read
     EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
@@ -82,17 +105,52 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
 }
 
+// Ids alike in the bytes that make the key share one candidate.
+TEST(LogLine, CandidatesDifferInTheirKeys) {
+  const std::string part(kKeyGameIdBytes, 'k');
+  KeyCandidates candidates;
+  for (const std::string &id : {part + "a", part + "b", part.substr(1) + "x", part})
+    AddCandidate(candidates, id);
+  EXPECT_EQ(candidates.game_ids, (std::vector<std::string>{part + "a", part.substr(1) + "x"}));
+}
+
+// Real days and times only, and a window that some time can pass.
+TEST(RecordFilter, BoundsAreRealTimesInAnOpenWindow) {
+  const std::pair<std::string, bool> bounds[] = {
+      {"2023-12-31T23:59:59", true},  {"2023-01-31", true},           {"2024-02-29", true},
+      {"2000-02-29", true},           {"2023-04-30", true},           {"2026-99-99", false},
+      {"2026-13-01", false},          {"2026-00-10", false},          {"2026-01-00", false},
+      {"2026-01-32", false},          {"2023-02-29", false},          {"1900-02-29", false},
+      {"2026-02-30", false},          {"2026-04-31", false},          {"2026-01-01T24:00:00", false},
+      {"2026-01-01T25:00:00", false}, {"2026-01-01T23:60:00", false}, {"2026-01-01T23:59:60", false}};
+  for (const auto &[bound, real] : bounds) EXPECT_EQ(IsTimeBound(bound), real) << bound;
+  const std::tuple<std::string, std::string, bool> windows[] = {
+      {"2024-05-17", "2024-05-17", true},
+      {"2024-05-17T23:59:59", "2024-05-17", true},
+      {"2024-05-18", "2024-05-17T23:59:59", false},
+      {"2024-05-17T08:00:01", "2024-05-17T08:00:00", false},
+      {"", "2000-01-01", true},
+      {"2999-01-01", "", true}};
+  for (const auto &[since, until, open] : windows)
+    EXPECT_EQ(WindowIsOpen({since, until, {}}), open) << since << " to " << until;
+}
+
 using Output = std::tuple<int, std::string, std::string>; // exit status, standard output, standard error
 class LogcatTool : public ::testing::Test {
 protected:
-  void SetUp() override { dir_ = MakeTempDirectory(), logs_ = dir_ + "/Orvane/Logs/"; }
+  void SetUp() override {
+    dir_ = MakeTempDirectory();
+    logs_ = dir_ + "/Orvane/Logs/";
+  }
   void TearDown() override { RemoveTree(dir_); }
-  // orvane-logcat with its output streams apart, `input` (or the null device) on standard input.
+  // orvane-logcat with its output streams apart, `input` (or the null device) on standard input, run as
+  // `user_` (a setpriv command line, or empty for this process's user).
   Output Run(std::vector<std::string> args, const std::string &input = "", int seconds = 30) {
     const std::string in = input.empty() ? "/dev/null" : dir_ + "/in";
     WriteFile(dir_ + "/in", input);
-    args.insert(args.begin(), {"sh", "-c", R"(exec "$0" "$@" <"$I" 2>"$T/err")", ORVANE_LOGCAT_PATH});
-    auto result = RunChild("/bin/sh", args, {{"I", in}, {"T", dir_}, {"XDG_DATA_HOME", dir_}}, seconds);
+    args.insert(args.begin(), {"sh", "-c", R"(exec $U "$0" "$@" <"$I" 2>"$T/err")", ORVANE_LOGCAT_PATH});
+    auto result =
+        RunChild("/bin/sh", args, {{"I", in}, {"T", dir_}, {"U", user_}, {"XDG_DATA_HOME", dir_}}, seconds);
     return {result.exit_code, result.output, ReadFile(dir_ + "/err").value_or("")};
   }
   // One process of the sample host, after `pause` ms: its first game id keys every log it writes.
@@ -115,7 +173,7 @@ protected:
         }
     return out;
   }
-  std::string dir_, logs_;
+  std::string dir_, logs_, user_;
 };
 
 TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
@@ -142,7 +200,8 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
       {{"--check", logs_}, logs_ + "gA.log: 3 records, 0 bad lines, 0 records with bytes not UTF-8\n" +
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};
   // clang-format on
-  for (const auto &[args, expected] : runs) EXPECT_EQ(Run(args), Output(0, expected, "")) << args[0];
+  for (const auto &[args, expected] : runs)
+    EXPECT_EQ(Run(args), Output(0, expected, "")) << ::testing::PrintToString(args);
   // Piped after an empty line and ended by a CR alone, followed or not: standard input is read once.
   const std::string line = Split(*ReadFile(logs_ + "gB.log"), "\n")[2];
   for (const std::vector<std::string> &args :
@@ -168,23 +227,78 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   EXPECT_EQ(followed, Output(-1, lb[3] + "\n" + s + t, waiting + bad + "\n"));
 }
 
-TEST_F(LogcatTool, UsageErrorsHelpAndVersion) {
+// A usage error, or a file or folder that could not be read (even after a bad line), exits 2 and says why.
+TEST_F(LogcatTool, UsageAndReadFailuresExitTwo) {
+  WriteFile(dir_ + "/.log", ""); // dir_ holds no log: ".log" is no log's name
+  WriteFile(dir_ + "/bad", "zz");
   // clang-format off
-  const std::pair<std::vector<std::string>, std::string> cases[] = { // dir_ holds no log
+  const std::pair<std::vector<std::string>, std::string> cases[] = {
       {{"--frobnicate"}, "unknown option --frobnicate\nTry 'orvane-logcat --help'.\n"},
       {{"--until"}, "needs a value"}, {{"--since", "yesterday", dir_}, "--since takes YYYY-MM-DD"},
+      {{"--since=2024-05-18", "--until=2024-05-17", dir_}, "--since 2024-05-18 is after --until 2024-05-17\n"},
       {{"--type=exit", dir_}, "--type takes INIT"}, {{"--check", "--follow"}, "do not go together"},
       {{"-"}, "standard input has no file name"}, {{dir_ + "/in"}, "does not end in .log"},
-      {{dir_ + "/.log"}, "does not end in .log"}, {{}, "no such folder"},
+      {{dir_ + "/.log"}, "does not end in .log"}, {{dir_ + "/x"}, "/x: cannot open: No such file or directory"},
+      {{}, "Logs/: cannot list: No such file or directory (no game has recorded here yet?)"},
+      {{"--check", dir_ + "/in/"}, "/in/: cannot open: Not a directory"},
+      {{"--check", "--key-game-id=g", "/proc/self/mem", dir_ + "/bad"}, "mem: read error: Input/output error"},
       {{logs_ + "g.log"}, "g.log: cannot open"}, {{"--", "-x.log"}, "-x.log: cannot open"}};
   // clang-format on
-  for (Output run; const auto &[args, message] : cases)
-    EXPECT_TRUE(std::get<0>(run = Run(args)) == 2 && std::get<2>(run).find(message) != std::string::npos)
-        << message;
+  for (const auto &[args, message] : cases) {
+    const auto [status, out, err] = Run(args);
+    EXPECT_EQ(status, 2) << message;
+    EXPECT_NE(err.find(message), std::string::npos) << err;
+  }
+  // A folder that cannot be listed is no empty folder, --check included (root may list any).
+  std::filesystem::create_directory(dir_ + "/locked");
+  std::filesystem::permissions(dir_ + "/locked", std::filesystem::perms::none);
+  user_ = geteuid() == 0 ? "setpriv --reuid=65534 --regid=65534 --clear-groups" : "";
+  const std::string denied = "orvane-logcat: " + dir_ + "/locked: cannot list: Permission denied\n";
+  EXPECT_EQ(Run({"--check", dir_ + "/locked"}), Output(2, "", denied));
+  user_.clear();
+  std::filesystem::permissions(dir_ + "/locked", std::filesystem::perms::owner_all);
   const std::string waiting = "orvane-logcat: " + logs_ + ": does not exist yet; waiting for it\n";
   EXPECT_EQ(Run({"--follow"}, "", 2), Output(-1, "", waiting)) << "said once";
   EXPECT_EQ(Run({"--help"}), Output(0, std::string(kHelpText), ""));
   EXPECT_EQ(Run({"--version"}), Output(0, "orvane-logcat " ORVANE_VERSION "\n", ""));
+}
+
+// A line break before the first line is no damage; a first record other than INIT and a torn line are.
+TEST_F(LogcatTool, CheckCountsTheBadLinesOfALog) {
+  Host({"init", "gC", "u1", "enter", "gC", "u1", "exit", "gC", "u1"});
+  const std::vector<std::string> lines = Split(*ReadFile(logs_ + "gC.log"), "\n"); // INIT, ENTER, EXIT
+  const std::string log = logs_ + "gD.log";
+  const std::string torn = ":2: " + std::string(FaultText(F::kNotBlocks));
+  const std::tuple<std::string, std::string, std::string> cases[] = {
+      {"\n" + lines[0] + "\n" + lines[1], "2 records, 0 bad lines", ""},
+      {"\r\n\n" + lines[1] + "\n" + lines[2], "1 records, 1 bad lines", ":3: first record is not INIT"},
+      {lines[0] + "\n" + lines[1].substr(0, 40) + "\n" + lines[2], "2 records, 1 bad lines", torn}};
+  for (const auto &[bytes, counts, reported] : cases) {
+    WriteFile(log, bytes);
+    const std::string said = reported.empty() ? "" : "orvane-logcat: " + log + reported + "\n";
+    const std::string summary = log + ": " + counts + ", 0 records with bytes not UTF-8\n";
+    EXPECT_EQ(Run({"--check", log}), Output(reported.empty() ? 0 : 1, summary, said)) << counts;
+  }
+}
+
+// Followed: a log cut shorter is read again from its start, one moved away and started again from the new
+// one's.
+TEST_F(LogcatTool, FollowsALogCutShorterOrReplaced) {
+  const std::string log = logs_ + "gR.log";
+  Host({"init", "gR", "u1", "enter", "gR", "u1"});
+  const std::string before = Printed("gR", {"gR"});
+  Output followed;
+  std::thread tail([&] { followed = Run({"--follow", log}, "", 4); });
+  std::this_thread::sleep_for(std::chrono::seconds(1));
+  WriteFile(log, Split(*ReadFile(log), "\n")[0]);
+  std::this_thread::sleep_for(std::chrono::seconds(1));
+  std::filesystem::rename(log, logs_ + "gR.old");
+  Host({"special", "gR", "u2", "s"}); // a new log: its INIT, then the record
+  tail.join();
+  const std::string notices =
+      "orvane-logcat: " + log + ": became shorter; reading it again from the start\n" +
+      "orvane-logcat: " + log + ": was replaced; reading the new file from its start\n";
+  EXPECT_EQ(followed, Output(-1, before + Split(before, "\n")[0] + "\n" + Printed("gR", {"gR"}), notices));
 }
 
 } // namespace
