@@ -35,9 +35,9 @@ bool IsTimeBound(std::string_view text) {
 }
 
 bool WindowIsOpen(const RecordFilter &filter) {
-  // As in Passes: a date alone as `until` takes in that whole day.
-  return filter.since.empty() || filter.until.empty() ||
-         std::string_view(filter.since).substr(0, filter.until.size()) <= filter.until;
+  // As in Passes: a date alone as `until` takes in that whole day. An empty
+  // bound compares as the earliest or, cut to nothing, as equal.
+  return std::string_view(filter.since).substr(0, filter.until.size()) <= filter.until;
 }
 
 bool IsEventType(std::string_view text) {
