@@ -4,6 +4,7 @@
 #include "key_discovery.h"
 #include "log_sources.h"
 #include "logformat/log_lines.h"
+#include "open_for_reading.h"
 #include "options.h"
 #include "record_output.h"
 #include "standard_input.h"
@@ -191,7 +192,7 @@ bool Open(Reader &reader, Source &source) {
     source.file = stdin;
     return true;
   }
-  source.file = std::fopen(source.name.c_str(), "rb");
+  source.file = OpenForReading(source.path);
   if (source.file != nullptr) {
     source.identity = IdentityOfOpenFile(source.file);
     return true;

@@ -5,7 +5,7 @@
 namespace orvane::logcat {
 namespace {
 
-// The number written in `text` at `at` with `digits` digits, all checked to be digits.
+// The number that the `digits` digits at `at` spell (the caller checked they are digits).
 int Number(std::string_view text, std::size_t at, std::size_t digits) {
   int value = 0;
   for (const char c : text.substr(at, digits)) value = value * 10 + (c - '0');
