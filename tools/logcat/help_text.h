@@ -115,8 +115,8 @@ DIAGNOSTICS
     decrypts, or that decrypts but is not a JSON object with the five
     members is reported once on standard error as FILE:LINE: reason, and
     reading goes on with the next line. A file or folder that does not
-    exist, cannot be opened, listed or read is reported with the system's
-    reason ("FILE: cannot open: No such file or directory", "FOLDER: cannot
+    exist (unless --follow waits for it), cannot be opened, listed or read
+    is reported with the system's reason ("FILE: cannot open: No such file or directory", "FOLDER: cannot
     list: Permission denied", "FILE: read error: ..."), and reading goes on
     with the next.
 
