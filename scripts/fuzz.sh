@@ -20,7 +20,7 @@ mkdir -p "$artifacts"
 export ASAN_OPTIONS="detect_leaks=1:abort_on_error=1:${ASAN_OPTIONS:-}"
 export UBSAN_OPTIONS="print_stacktrace=1:halt_on_error=1:${UBSAN_OPTIONS:-}"
 
-for target in record; do
+for target in record line; do
   printf '\n==== %s_fuzzer, %s s ====\n' "$target" "$seconds"
   mkdir -p "$work/$target"
   # libFuzzer reports every new input; keep that in a file and show the

@@ -4,10 +4,15 @@
 #include "help_text.h"
 #include "key_discovery.h"
 #include "logformat/hex.h"
+#include "logformat/key_text.h"
+#include "record_filter.h"
 #include "support/test_support.h"
 #include "valid_utf8.h"
 
+#include <filesystem>
 #include <thread>
+
+#include <unistd.h>
 
 namespace orvane::logcat {
 namespace {
@@ -21,9 +26,11 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
       {"{\"user_id\":\"a\\\"b\xff\x80\",\"game_id\":\"c\\\\d\",\"type\":\"j\xc3\xa9u\",\"time\":\"t\","
        R"("extra":"\b\f\n\r\t\u0001\u0000)" "\x7f\"}", // every escape the library writes; raw bytes
        {"a\"b\xff\x80", "c\\d", "j\xc3\xa9u", "t", std::string("\b\f\n\r\t\x01\0\x7f", 8)}},
-      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\\ud800\\udc00\",\t\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
+      {" {\"extra\" :\"\\/\\u00Aa\\u20AC\\u07ff\\u0080\\u0039\\ud800\\udc00\",\t"
+       "\"time\": \"\\ud83d\\ude00\" ,\"type\":\"T\",\r\n"
        "\"game_id\":\"g\",\"user_id\":\"\\uDBFF\\uDFFF\" } ", // other writers' forms
-       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80", "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9\xf0\x90\x80\x80"}}};
+       {"\xf4\x8f\xbf\xbf", "g", "T", "\xf0\x9f\x98\x80",
+        "/\xc2\xaa\xe2\x82\xac\xdf\xbf\xc2\x80" "9\xf0\x90\x80\x80"}}};
   const std::string h = R"({"user_id":"u","game_id":"g","type":"T","time":"t")", refused[] = {
       "", "{}", h + "}", h + R"(,"extra":"x")", h + R"(,"extra":"x"}})", h + R"(,"user_id":"x"})",
       h + R"(,"extra":1})", h + R"(,"Extra":"x"})", h + R"(,"extra" "x"})", h + R"(,"extra":"x",})",
@@ -39,12 +46,19 @@ TEST(RecordJson, ReadsTheFiveMembersAndNothingElse) {
 // Valid UTF-8 is copied; a byte alone, overlong, of a surrogate, above U+10FFFF or cut short is escaped.
 TEST(ValidUtf8, EscapesExactlyTheBytesNotPartOfUtf8) {
   const std::string valid = "\xc2\x80\xdf\xbf\xe0\xa0\x80\xed\x9f\xbf\xf0\x90\x80\x80\xf4\x8f\xbf\xbf";
-  const std::string bad = "\x80\xbf\xc0\xaf\xc1\xbf\xe0\x9f\xbf\xf0\x8f\xbf\xbf\xed\xa0\x80\xf4\x90\x80\x80";
-  const std::string escaped = R"(\u0080\u00bf\u00c0\u00af\u00c1\u00bf\u00e0\u009f\u00bf\u00f0\u008f\u00bf)"
-                              R"(\u00bf\u00ed\u00a0\u0080\u00f4\u0090\u0080\u0080\u00f5\u00fe\u00ff a\u00e2)";
-  std::string out = "kept";
-  EXPECT_EQ(AppendValidUtf8(out, valid + bad + "\xf5\xfe\xff a\xe2\x82x\xc3 eight ok\xe9\xc3\xa9\xe9"), 28u);
-  EXPECT_EQ(out, "kept" + valid + escaped + "\\u0082x\\u00c3 eight ok\\u00e9\xc3\xa9\\u00e9");
+  // clang-format off
+  const std::pair<std::string, std::string> cases[] = { // bytes, printed
+      {valid, valid}, {"\x80\xbf\xf5\xfe\xff", R"(\u0080\u00bf\u00f5\u00fe\u00ff)"}, // never the start of one
+      {"\xc0\xaf\xc1\xbf\xe0\x9f\xbf", R"(\u00c0\u00af\u00c1\u00bf\u00e0\u009f\u00bf)"}, // overlong
+      {"\xf0\x8f\xbf\xbf\xed\xa0\x80", R"(\u00f0\u008f\u00bf\u00bf\u00ed\u00a0\u0080)"}, // and a surrogate
+      {"\xf4\x90\x80\x80", R"(\u00f4\u0090\u0080\u0080)"}, {"a\xe2\x82x\xc3 b", R"(a\u00e2\u0082x\u00c3 b)"},
+      {"\xe9\xc3\xa9\xe9", "\\u00e9\xc3\xa9\\u00e9"}};
+  // clang-format on
+  for (const auto &[bytes, printed] : cases) {
+    std::string out = "kept";
+    EXPECT_EQ(AppendValidUtf8(out, bytes) * 5, printed.size() - bytes.size()) << printed; // 5 more an escape
+    EXPECT_EQ(out, "kept" + printed) << printed;
+  }
 }
 
 std::size_t g_count = 0;
@@ -52,15 +66,16 @@ std::size_t g_count = 0;
 TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   const KeyText &key_text = TakeKeyText("g1"); // the library encrypts every line of this process under g1
   RecordCipher cipher;
-  auto encrypt = [&](std::string_view t, std::string h = "") {
-    EncryptRecordText(cipher, key_text, t, h);
-    return h;
-  };
-  const std::string good = encrypt(R"({"user_id":"u","game_id":"g","type":"T","time":"t","extra":""})");
+  std::string good;
+  std::string not_record;
+  EncryptRecordText(cipher, key_text, R"({"user_id":"u","game_id":"g","type":"T","time":"t","extra":""})",
+                    good);
+  EncryptRecordText(cipher, key_text, R"({"user_id":"u"})", not_record);
   const std::vector<std::string> first = {"g1", "g2", "g3"}, last = {"g2", "g3", "g1"};
   CallsGuard guard;
   cipher::backend().decrypt = [](cipher::Session *s, const std::uint8_t *in, std::size_t n, std::uint8_t *o) {
-    return ++g_count, cipher::native_backend().decrypt(s, in, n, o);
+    ++g_count;
+    return cipher::native_backend().decrypt(s, in, n, o);
   };
   KeyPool pool;
   LineBuffers buf;
@@ -70,9 +85,10 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
       {good, {first}, F::kNone, 0, 1}, {good, {last}, F::kNone, 2, 3}, {good, {last, 2}, F::kNone, 2, 1},
       {good, {first, 2}, F::kNone, 0, 2}, {good, {{"g2", "g3"}, 1}, F::kBadPadding, 1, 2},
       {good.substr(0, 32), {first, 1}, F::kBadPadding, 1, 3}, // its first block alone
-      {encrypt(R"({"user_id":"u"})"), {last, 1}, F::kNotRecord, 1, 3}, {"", {first}, F::kNotBlocks, 0, 0},
+      {not_record, {last, 1}, F::kNotRecord, 1, 3}, {"", {first}, F::kNotBlocks, 0, 0},
       {good.substr(8), {first}, F::kNotBlocks, 0, 0}, {"x", {first}, F::kNotHex, 0, 0},
-      {good.substr(0, 10) + "g" + good.substr(11), {first}, F::kNotHex, 0, 0}};
+      {good.substr(0, 10) + "g" + good.substr(11), {first}, F::kNotHex, 0, 0},
+      {good, {}, F::kBadPadding, 0, 0}}; // no candidate
   for (auto c : cases) // braces: ReadLine runs before the winner and the count are read
     EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
@@ -83,20 +99,40 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   KeyCandidates unusable{{"g4"}};
   EXPECT_EQ(ReadLine(pool, unusable, good, buf, r), F::kBadPadding);
   EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
+  const std::string part(kKeyGameIdBytes, 'k'); // ids alike in the bytes that make the key: one candidate
+  KeyCandidates alike;
+  for (const std::string &id : {part + "a", part + "b", part.substr(1) + "x", part}) AddCandidate(alike, id);
+  EXPECT_EQ(alike.game_ids, (std::vector<std::string>{part + "a", part.substr(1) + "x"}));
+}
+
+// Real days and times only, and a window that some time can pass.
+TEST(RecordFilter, BoundsAreRealTimesInAnOpenWindow) {
+  for (const std::string bad :
+       {"2026-13-01", "2026-00-10", "2026-01-00", "2026-01-32", "2023-02-29", "1900-02-29", "2024-02-30",
+        "2026-04-31", "2026-06-31", "2026-09-31", "2026-11-31", "2026-01-01T24:00:00", "2026-01-01T23:60:00",
+        "2026-01-01T23:59:60", "2026/01/01", "2026-01-01 00:00:00"})
+    EXPECT_FALSE(IsTimeBound(bad)) << bad;
+  for (const std::string real :
+       {"2000-02-29", "2024-02-29", "2023-01-31", "2023-04-30", "2023-12-31T23:59:59"})
+    EXPECT_TRUE(IsTimeBound(real)) << real;
+  EXPECT_TRUE(WindowIsOpen({"2023-01-31", "2023-01-31", {}}) &&
+              WindowIsOpen({"2023-12-31T23:59:59", "2023-12-31", {}})); // a date alone: its whole day
+  EXPECT_FALSE(WindowIsOpen({"2023-01-31T08:00:01", "2023-01-31T08:00:00", {}}));
+  EXPECT_FALSE(WindowIsOpen({"2023-04-30", "2023-01-31T23:59:59", {}}));
 }
 
 using Output = std::tuple<int, std::string, std::string>; // exit status, standard output, standard error
 class LogcatTool : public ::testing::Test {
 protected:
-  void SetUp() override { dir_ = MakeTempDirectory(), logs_ = dir_ + "/Orvane/Logs/"; }
   void TearDown() override { RemoveTree(dir_); }
-  // orvane-logcat with its output streams apart, `input` (or the null device) on standard input.
+  // orvane-logcat as `user_` (setpriv's arguments, or none), `input` (or the null device) on standard input.
   Output Run(std::vector<std::string> args, const std::string &input = "", int seconds = 30) {
     const std::string in = input.empty() ? "/dev/null" : dir_ + "/in";
     WriteFile(dir_ + "/in", input);
-    args.insert(args.begin(), {"sh", "-c", R"(exec "$0" "$@" <"$I" 2>"$T/err")", ORVANE_LOGCAT_PATH});
-    auto result = RunChild("/bin/sh", args, {{"I", in}, {"T", dir_}, {"XDG_DATA_HOME", dir_}}, seconds);
-    return {result.exit_code, result.output, ReadFile(dir_ + "/err").value_or("")};
+    args.insert(args.begin(), {"sh", "-c", R"(exec $U "$0" "$@" <"$I" 2>"$T/err")", ORVANE_LOGCAT_PATH});
+    auto ran =
+        RunChild("/bin/sh", args, {{"I", in}, {"T", dir_}, {"U", user_}, {"XDG_DATA_HOME", dir_}}, seconds);
+    return {ran.exit_code, ran.output, ReadFile(dir_ + "/err").value_or("")};
   }
   // One process of the sample host, after `pause` ms: its first game id keys every log it writes.
   void Host(std::vector<std::string> calls, int status = 0, int pause = 0) {
@@ -118,7 +154,9 @@ protected:
         }
     return out;
   }
-  std::string dir_, logs_;
+  std::string dir_ = MakeTempDirectory();
+  std::string logs_ = dir_ + "/Orvane/Logs/";
+  std::string user_;
 };
 
 TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
@@ -140,12 +178,14 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
       {{"--with-file", logs_ + "gA.log"}, Printed("gA", ids, true)}, {{}, a + b}, // none: the default folder
       {{"--type", "INIT", "--type=EXIT", "--type=SPECIAL", logs_},
        Split(a, "\n")[0] + "\n" + Split(a, "\n")[2] + "\n" + lb[0] + "\n" + lb[3] + "\n"},
-      {{"--since=2999-01-01T00:00:00", logs_}, ""}, {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
+      {{"--since=2999-01-01T00:00:00", logs_}, ""},
+      {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
       {{"--since", first, "--until=" + day, logs_}, a + b}, // bounds hold their own second and day
       {{"--check", logs_}, logs_ + "gA.log: 3 records, 0 bad lines, 0 records with bytes not UTF-8\n" +
                            logs_ + "gB.log: 4 records, 0 bad lines, 1 records with bytes not UTF-8\n"}};
   // clang-format on
-  for (const auto &[args, expected] : runs) EXPECT_EQ(Run(args), Output(0, expected, "")) << args[0];
+  for (const auto &[args, expected] : runs)
+    EXPECT_EQ(Run(args), Output(0, expected, "")) << ::testing::PrintToString(args);
   // Piped after an empty line and ended by a CR alone, followed or not: standard input is read once.
   const std::string line = Split(*ReadFile(logs_ + "gB.log"), "\n")[2];
   for (const std::vector<std::string> &args :
@@ -158,36 +198,74 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   const std::string bad = "orvane-logcat: " + logs_ + "gA.log:5: " + std::string(FaultText(F::kBadPadding));
   EXPECT_EQ(Run({logs_}), Output(1, Printed("gA", {"gA", "gB", ""}) + b, bad + "\n"));
   // Followed: the logs, then each new line once, the newest before it ends; one keyed by a new log's game;
-  // a missing log is waited for.
+  // a missing log is waited for; one cut shorter is read again, one moved away and started again is read
+  // from the new one's start.
   Output followed;
   std::thread tail([&] { followed = Run({"--follow", "--type=SPECIAL", logs_, logs_ + "gW.log"}, "", 6); });
   Host({"enter", "gF", "u6", "special", "gB", "u6", "s"}, 0, 500);
   Host({"special", "gA", "u7", "t"}, 0, 500);
   Host({"exit", "gA", "u7"}, 0, 500);
+  const std::string s = Split(Printed("gB", {"gA", "gB", "gF"}), "\n")[4] + "\n";
+  const std::string t = Split(Printed("gA", {"gA", "gB", ""}), "\n")[4] + "\n";
+  std::this_thread::sleep_for(std::chrono::milliseconds(500));
+  std::filesystem::resize_file(logs_ + "gB.log", ReadFile(logs_ + "gB.log")->rfind('\n')); // back to lb[3]
+  std::this_thread::sleep_for(std::chrono::milliseconds(500));
+  std::filesystem::rename(logs_ + "gA.log", logs_ + "gA.old");
+  Host({"special", "gA", "u8", "v"}); // a new log: its INIT, then this
   tail.join();
-  const std::string s = Split(Printed("gB", {"gA", "gB", "gF"}), "\n")[4] + "\n",
-                    t = Split(Printed("gA", {"gA", "gB", ""}), "\n")[4] + "\n";
-  const std::string waiting = "orvane-logcat: " + logs_ + "gW.log: does not exist yet; waiting for it\n";
-  EXPECT_EQ(followed, Output(-1, lb[3] + "\n" + s + t, waiting + bad + "\n"));
+  const std::string v = Split(Printed("gA", {"gA"}), "\n")[1] + "\n";
+  const std::string said = "orvane-logcat: " + logs_;
+  const std::string notices = said + "gW.log: does not exist yet; waiting for it\n" + bad + "\n" + said +
+                              "gB.log: became shorter; reading it again from the start\n" + said +
+                              "gA.log: was replaced; reading the new file from its start\n";
+  EXPECT_EQ(followed, Output(-1, lb[3] + "\n" + s + t + lb[3] + "\n" + v, notices));
 }
 
-TEST_F(LogcatTool, UsageErrorsHelpAndVersion) {
+// A usage error, or a file or folder that could not be read (even after a bad line), exits 2 and says why.
+TEST_F(LogcatTool, UsageAndReadFailuresExitTwo) {
+  std::filesystem::create_directory(dir_ + "/locked");
+  std::filesystem::permissions(dir_ + "/locked", std::filesystem::perms::none);
+  user_ = geteuid() == 0 ? "setpriv --reuid=65534 --regid=65534 --clear-groups" : ""; // root may list any
   // clang-format off
-  const std::pair<std::vector<std::string>, std::string> cases[] = { // dir_ holds no log
+  const std::pair<std::vector<std::string>, std::string> cases[] = {
       {{"--frobnicate"}, "unknown option --frobnicate\nTry 'orvane-logcat --help'.\n"},
       {{"--until"}, "needs a value"}, {{"--since", "yesterday", dir_}, "--since takes YYYY-MM-DD"},
+      {{"--since=2024-05-18", "--until=2024-05-17", dir_}, "2024-05-18 is after --until 2024-05-17\nTry"},
       {{"--type=exit", dir_}, "--type takes INIT"}, {{"--check", "--follow"}, "do not go together"},
       {{"-"}, "standard input has no file name"}, {{dir_ + "/in"}, "does not end in .log"},
-      {{dir_ + "/.log"}, "does not end in .log"}, {{}, "no such folder"},
-      {{logs_ + "g.log"}, "g.log: cannot open"}, {{"--", "-x.log"}, "-x.log: cannot open"}};
+      {{"--follow", dir_ + "/.log"}, "does not end in .log"}, {{"--", "-x.log"}, "-x.log: cannot open"},
+      {{}, "Logs/: cannot list: No such file or directory (no game has recorded here yet?)"},
+      {{dir_ + "/x"}, "/x: cannot open: No such file or directory"}, // not taken for a log without a key
+      {{"--check", dir_ + "/in/"}, "/in/: cannot open: Not a directory"},
+      {{"--check", "--key-game-id=g", "/proc/self/mem", "/proc/self/cmdline"}, "read error: Input/output"},
+      {{"--check", dir_ + "/locked"}, "/locked: cannot list: Permission denied"}}; // no empty folder
   // clang-format on
-  for (Output run; const auto &[args, message] : cases)
-    EXPECT_TRUE(std::get<0>(run = Run(args)) == 2 && std::get<2>(run).find(message) != std::string::npos)
-        << message;
+  for (const auto &[args, message] : cases) {
+    const auto [status, out, err] = Run(args);
+    const bool said = err.find(message) != std::string::npos;
+    const bool empty = err.find("holds no .log files") != std::string::npos; // no folder here is empty
+    EXPECT_TRUE(status == 2 && said && !empty) << message << "\n" << err;
+  }
+  std::filesystem::permissions(dir_ + "/locked", std::filesystem::perms::owner_all);
   const std::string waiting = "orvane-logcat: " + logs_ + ": does not exist yet; waiting for it\n";
   EXPECT_EQ(Run({"--follow"}, "", 2), Output(-1, "", waiting)) << "said once";
   EXPECT_EQ(Run({"--help"}), Output(0, std::string(kHelpText), ""));
   EXPECT_EQ(Run({"--version"}), Output(0, "orvane-logcat " ORVANE_VERSION "\n", ""));
+}
+
+// Line breaks before the first line are no damage; a first record other than INIT and a torn line are.
+TEST_F(LogcatTool, CheckCountsTheBadLinesOfALog) {
+  Host({"init", "gC", "u1", "enter", "gC", "u1", "exit", "gC", "u1"});
+  const std::vector<std::string> lines = Split(*ReadFile(logs_ + "gC.log"), "\n"); // INIT, ENTER, EXIT
+  const std::tuple<std::string, std::string, std::string> cases[] = {
+      {"\r\n\n" + lines[1] + "\n" + lines[2], "1 records", ":3: first record is not INIT"},
+      {"\n" + lines[0] + "\n" + lines[1].substr(0, 40) + "\n" + lines[2], "2 records", // torn by a death
+       ":3: " + std::string(FaultText(F::kNotBlocks))}};
+  for (const auto &[bytes, records, reported] : cases) {
+    const std::string summary = "-: " + records + ", 1 bad lines, 0 records with bytes not UTF-8\n";
+    const Output expected(1, summary, "orvane-logcat: -" + reported + "\n");
+    EXPECT_EQ(Run({"--check", "--key-game-id=gC"}, bytes), expected) << reported;
+  }
 }
 
 } // namespace

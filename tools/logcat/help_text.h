@@ -62,13 +62,14 @@ OPTIONS
 
     --since TIME
         Only records at or after TIME, given as YYYY-MM-DDTHH:MM:SS (UTC,
-        the record time's own form) or as a date alone, YYYY-MM-DD. Times
-        are compared as text.
+        the record time's own form) or as a date alone, YYYY-MM-DD, naming
+        a real day and time. Times are compared as text.
         Example: orvane-logcat --since 2024-05-17T08:00:00 Logs/
 
     --until TIME
         Only records at or before TIME, in the same forms; a date alone
-        takes in that whole day.
+        takes in that whole day. A window that starts after it ends is a
+        usage error.
         Example: orvane-logcat --until 2024-05-17 Logs/
 
     --type TYPE
@@ -79,13 +80,18 @@ OPTIONS
     --check
         Print no records; print for each file "FILE: N records, M bad
         lines, K records with bytes not UTF-8" instead. Filters narrow the
-        records counted.
+        records counted. A log whose first record is not INIT has lost its
+        start: that line is reported as "FILE:LINE: first record is not
+        INIT" and counted as bad.
         Example: orvane-logcat --check Logs/
 
     --follow
         After the end of each file, keep reading lines as they are
         appended, like tail -f, until interrupted. A missing file is waited
         for, and *.log files that appear in a folder later are read too.
+        A file cut shorter is read again from its start, and one replaced
+        at its path (moved away and started again) is read to its end,
+        then the new file from its start; both are noted on standard error.
         Filters apply as they do without --follow. Standard input is read to
         its end and not followed.
         Example: orvane-logcat --follow --type SPECIAL Logs/
@@ -104,15 +110,21 @@ OPTIONS
 
 DIAGNOSTICS
     Line breaks may be LF or CR LF; empty lines carry no record and are
-    skipped. A line that is not lowercase hex of whole 16-byte blocks, that
-    no key tried decrypts, or that decrypts but is not a JSON object with
-    the five members is reported once on standard error as FILE:LINE:
-    reason, and reading goes on with the next line.
+    skipped. A line that is not lowercase hex of whole 16-byte blocks (one
+    torn by a writer that died while writing it), that no key tried
+    decrypts, or that decrypts but is not a JSON object with the five
+    members is reported once on standard error as FILE:LINE: reason, and
+    reading goes on with the next line. A file or folder that does not
+    exist (unless --follow waits for it), cannot be opened, listed or read
+    is reported with the system's reason ("FILE: cannot open: No such file or directory", "FOLDER: cannot
+    list: Permission denied", "FILE: read error: ..."), and reading goes on
+    with the next.
 
 EXIT STATUS
     0   every line was a good record
-    1   some lines were bad
-    2   a usage error, or a file or folder that could not be read
+    1   some lines were bad (with --check, also a first record not INIT)
+    2   a usage error, or a file or folder that could not be found, opened,
+        listed or read, in every mode, --check included; it outranks 1
 )";
 
 } // namespace orvane::logcat

@@ -16,9 +16,8 @@ std::optional<std::string> GameIdOfLogName(const std::filesystem::path &file) {
   return name.substr(0, name.size() - kExtension.size());
 }
 
-std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folder) {
+std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folder, std::error_code &error) {
   std::vector<std::filesystem::path> files;
-  std::error_code error;
   for (std::filesystem::directory_iterator entry(folder, error), end; !error && entry != end;
        entry.increment(error)) {
     std::error_code type_error;
@@ -30,7 +29,8 @@ std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folde
 
 std::vector<std::string> GameIdsIn(const std::filesystem::path &folder) {
   std::vector<std::string> ids;
-  for (const auto &file : LogFilesIn(folder)) ids.push_back(*GameIdOfLogName(file));
+  std::error_code error;
+  for (const auto &file : LogFilesIn(folder, error)) ids.push_back(*GameIdOfLogName(file));
   return ids;
 }
 

@@ -6,6 +6,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <system_error>
 #include <vector>
 
 namespace orvane::logcat {
@@ -14,11 +15,12 @@ namespace orvane::logcat {
 // nullopt for a name that does not end in ".log".
 std::optional<std::string> GameIdOfLogName(const std::filesystem::path &file);
 
-// The *.log files directly inside `folder`, sorted by name; empty when it
-// holds none or cannot be listed.
-std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folder);
+// The *.log files directly inside `folder`, sorted by name; `error` tells
+// why when it cannot be listed (or not to its end).
+std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folder, std::error_code &error);
 
-// The game ids of the *.log files directly inside `folder`.
+// The game ids of the *.log files directly inside `folder`; none when it
+// cannot be listed.
 std::vector<std::string> GameIdsIn(const std::filesystem::path &folder);
 
 // The folder the library writes to on this machine, by the library's own

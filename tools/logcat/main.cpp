@@ -1,14 +1,15 @@
 // orvane-logcat: reads games' encrypted log files back into records, one JSON
 // object per line, checks them, and follows them as games append.
+#include "file_identity.h"
 #include "key_discovery.h"
 #include "log_sources.h"
 #include "logformat/log_lines.h"
+#include "open_for_reading.h"
 #include "options.h"
+#include "record_output.h"
 #include "standard_input.h"
-#include "valid_utf8.h"
 
 #include "cipher/cipher.h"
-#include "logformat/record_text.h"
 
 #include <cerrno>
 #include <chrono>
@@ -17,6 +18,7 @@
 #include <deque>
 #include <exception>
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <system_error>
@@ -38,20 +40,21 @@ struct Source {
   fs::file_time_type folder_time{}; // of the folder when it was last listed
   KeyCandidates keys;
   std::FILE *file = nullptr;
-  bool done = false;         // nothing more will be read from it
-  bool said_waiting = false; // the "does not exist yet" notice went out
-  bool unreadable = false;   // could not be opened or read
+  std::optional<FileIdentity> identity; // of the open file
+  bool done = false;                    // nothing more will be read from it
+  bool said_waiting = false;            // the "does not exist yet" notice went out
+  bool unreadable = false;              // could not be opened or read
+  bool any_line = false;                // a line that is not empty was read: the next is not the first
   LineSplitter lines;
   std::uint64_t offset = 0;      // bytes read so far
   std::size_t shown_partial = 0; // size of an unended line already taken, or 0
-  std::uint64_t records = 0;
-  std::uint64_t bad_lines = 0;
-  std::uint64_t not_utf8 = 0; // records that held bytes not part of valid UTF-8
+  LogCounts counts;
 };
 
 struct Folder {
   fs::path path;
   bool said_waiting = false;
+  bool done = false; // could not be listed
 };
 
 struct Reader {
@@ -61,7 +64,7 @@ struct Reader {
   std::vector<Folder> folders;
   LineBuffers buffers;
   EventRecord record;
-  std::string json; // one record's text before it is made valid UTF-8
+  std::string json; // scratch for one record's text
   int status = 0;
 };
 
@@ -70,6 +73,12 @@ void Raise(Reader &reader, int status) {
 }
 
 void Complain(const std::string &text) { std::fprintf(stderr, "orvane-logcat: %s\n", text.c_str()); }
+
+// A file or folder that could not be read: the run fails, reading goes on.
+void Fail(Reader &reader, const std::string &text) {
+  Complain(text);
+  Raise(reader, 2);
+}
 
 // Adds the game ids of the source's folder to its candidates. True when the
 // folder changed since it was last listed and gave a new one: a process
@@ -112,20 +121,31 @@ bool AddSource(Reader &reader, const fs::path &path) {
   return false;
 }
 
-// Adds the folder's *.log files that are not read yet.
+// Adds the folder's *.log files that are not read yet. A folder that does
+// not exist is waited for when following; one that cannot be listed fails.
 void ScanFolder(Reader &reader, Folder &folder) {
+  if (folder.done) return;
   std::error_code error;
-  if (!fs::is_directory(folder.path, error)) {
-    if (!reader.options.follow) {
-      Complain(folder.path.string() + ": no such folder (no game has recorded here yet?)");
-      Raise(reader, 2);
-    } else if (!folder.said_waiting) {
-      Complain(folder.path.string() + ": does not exist yet; waiting for it");
-    }
+  const std::vector<fs::path> files = LogFilesIn(folder.path, error);
+  const bool missing = error == std::errc::no_such_file_or_directory;
+  if (missing && reader.options.follow) {
+    if (!folder.said_waiting) Complain(folder.path.string() + ": does not exist yet; waiting for it");
     folder.said_waiting = true;
     return;
   }
-  for (const fs::path &file : LogFilesIn(folder.path)) AddSource(reader, file);
+  if (error) {
+    Fail(reader, folder.path.string() + ": cannot list: " + error.message() +
+                     (missing ? " (no game has recorded here yet?)" : ""));
+    folder.done = true;
+    return;
+  }
+  for (const fs::path &file : files) AddSource(reader, file);
+}
+
+void ReportBadLine(Reader &reader, Source &source, std::uint64_t number, std::string_view reason) {
+  ++source.counts.bad_lines;
+  Raise(reader, 1);
+  Complain(source.name + ":" + std::to_string(number) + ": " + std::string(reason));
 }
 
 // Reads one line. True when a key read it, whether or not the filters pass
@@ -133,42 +153,30 @@ void ScanFolder(Reader &reader, Folder &folder) {
 // unended line may still be growing.
 bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_view line, std::string &out,
               bool report) {
+  // Empty lines carry nothing: a writer may put a line break before a log's first line.
   if (line.empty()) return false;
   LineFault fault = ReadLine(reader.pool, source.keys, line, reader.buffers, reader.record);
   if ((fault == LineFault::kBadPadding || fault == LineFault::kNotRecord) && ListFolderKeys(source))
     fault = ReadLine(reader.pool, source.keys, line, reader.buffers, reader.record);
+  if (fault != LineFault::kNone && !report) return false;
+  const bool first = !source.any_line;
+  source.any_line = true;
   if (fault != LineFault::kNone) {
-    if (!report) return false;
-    ++source.bad_lines;
-    Raise(reader, 1);
-    Complain(source.name + ":" + std::to_string(number) + ": " + std::string(FaultText(fault)));
+    ReportBadLine(reader, source, number, FaultText(fault));
     return false;
   }
-  if (!Passes(reader.options.filter, reader.record)) return true;
-  ++source.records;
-  const std::size_t start = out.size();
-  std::string &json = reader.json;
-  json.clear();
-  AppendRecordJson(json, reader.record);
-  const bool more = reader.options.with_file || reader.options.show_key;
-  if (more) json.pop_back(); // the added members go inside the record's closing brace
-  if (AppendValidUtf8(out, json) != 0) ++source.not_utf8;
-  if (more) {
-    json.clear();
-    if (reader.options.with_file) {
-      json += ",\"file\":\"";
-      orvane::AppendJsonEscaped(json, source.file_name);
-      json += '"';
-    }
-    if (reader.options.show_key) {
-      json += ",\"key_game_id\":\"";
-      orvane::AppendJsonEscaped(json, source.keys.game_ids[source.keys.winner]);
-      json += '"';
-    }
-    json += '}';
-    AppendValidUtf8(out, json);
+  // Every log the library starts begins with its INIT record.
+  if (first && reader.options.check && reader.record.type != "INIT") {
+    ReportBadLine(reader, source, number, "first record is not INIT");
+    return true;
   }
-  out += '\n';
+  if (!Passes(reader.options.filter, reader.record)) return true;
+  ++source.counts.records;
+  AddedMembers added;
+  if (reader.options.with_file) added.file = source.file_name;
+  if (reader.options.show_key) added.key_game_id = source.keys.game_ids[source.keys.winner];
+  const std::size_t start = out.size();
+  if (AppendRecordLine(out, reader.json, reader.record, added)) ++source.counts.not_utf8;
   if (reader.options.check) out.resize(start);
   return true;
 }
@@ -186,40 +194,56 @@ bool Open(Reader &reader, Source &source) {
     source.file = stdin;
     return true;
   }
-  source.file = std::fopen(source.name.c_str(), "rb");
-  if (source.file != nullptr) return true;
+  source.file = OpenForReading(source.path);
+  if (source.file != nullptr) {
+    source.identity = IdentityOfOpenFile(source.file);
+    return true;
+  }
   const int error = errno;
   if (reader.options.follow && error == ENOENT) {
     if (!source.said_waiting) Complain(source.name + ": does not exist yet; waiting for it");
     source.said_waiting = true;
     return false;
   }
-  Complain(source.name + ": cannot open: " + std::strerror(error));
-  Raise(reader, 2);
+  Fail(reader, source.name + ": cannot open: " + std::strerror(error));
   source.done = true;
   source.unreadable = true;
   return false;
 }
 
-// A followed file that became shorter than what was read has been replaced
-// or cut: read it again from the start.
-void NoticeTruncation(Source &source) {
-  std::error_code error;
-  const auto size = fs::file_size(source.path, error);
-  if (error || size >= source.offset) return;
-  Complain(source.name + ": became shorter; reading it again from the start");
+// Closes a followed file so that the next poll reads it from its start.
+void StartAgain(Source &source, const std::string &why) {
+  Complain(source.name + ": " + why);
   std::fclose(source.file);
   source.file = nullptr;
   source.lines = {};
   source.offset = 0;
   source.shown_partial = 0;
+  source.any_line = false;
 }
 
-// Reads what the source holds now. Returns true when it read any bytes.
+// True when the path names another file than the open one: the log was
+// moved away and started again. Until a file is there, the open one is kept.
+bool WasReplaced(const Source &source) {
+  const std::optional<FileIdentity> now = IdentityAtPath(source.path);
+  return now && source.identity && *now != *source.identity;
+}
+
+// A followed file that became shorter than what was read has been cut:
+// read it again from the start.
+void NoticeTruncation(Source &source) {
+  std::error_code error;
+  const auto size = fs::file_size(source.path, error);
+  if (!error && size < source.offset) StartAgain(source, "became shorter; reading it again from the start");
+}
+
+// Reads what the source holds now. Returns true when it read any bytes or
+// starts a replaced file again.
 bool ReadAvailable(Reader &reader, Source &source) {
   const bool follow = reader.options.follow && !source.is_stdin;
   if (source.done) return false;
-  if (source.file != nullptr && follow) NoticeTruncation(source);
+  const bool replaced = follow && source.file != nullptr && WasReplaced(source);
+  if (follow && source.file != nullptr && !replaced) NoticeTruncation(source);
   if (source.file == nullptr && !Open(reader, source)) return false;
   std::string out;
   static char buffer[1 << 16];
@@ -241,16 +265,17 @@ bool ReadAvailable(Reader &reader, Source &source) {
     Emit(out);
   }
   if (std::ferror(source.file)) {
-    Complain(source.name + ": read error: " + std::strerror(errno));
-    Raise(reader, 2);
+    Fail(reader, source.name + ": read error: " + std::strerror(errno));
     source.done = true;
     source.unreadable = true;
   }
   std::clearerr(source.file);
   const std::string_view last = PartialLine(source.lines);
-  if (source.done || !follow) {
-    TakeLine(reader, source, source.lines.next_number, last, out, true);
-    source.done = true;
+  if (source.done || !follow || replaced) {
+    // Nothing more comes to this file: its unended last line is whole.
+    if (last.size() != source.shown_partial)
+      TakeLine(reader, source, source.lines.next_number, last, out, true);
+    source.done = !replaced;
   } else if (!last.empty() && source.shown_partial == 0) {
     // The library writes no line break after the last line, so the newest
     // record has none yet. It is taken as soon as it decodes; an unended
@@ -259,15 +284,16 @@ bool ReadAvailable(Reader &reader, Source &source) {
       source.shown_partial = last.size();
   }
   Emit(out);
-  return any;
+  if (replaced) StartAgain(source, "was replaced; reading the new file from its start");
+  return any || replaced;
 }
 
 // Reads a folder's *.log files where the folder stands among the arguments.
 void AddFolder(Reader &reader, const fs::path &path) {
   const std::size_t before = reader.sources.size();
-  ScanFolder(reader, reader.folders.emplace_back(Folder{path}));
-  std::error_code error;
-  if (reader.sources.size() == before && fs::is_directory(path, error))
+  Folder &folder = reader.folders.emplace_back(Folder{path});
+  ScanFolder(reader, folder);
+  if (reader.sources.size() == before && !folder.done && !folder.said_waiting)
     Complain(path.string() + ": holds no .log files");
 }
 
@@ -286,8 +312,13 @@ bool AddArguments(Reader &reader) {
   bool ok = true;
   for (const std::string &path : paths) {
     std::error_code error;
-    if (path != "-" && fs::is_directory(path, error))
+    const fs::file_type type = path == "-" ? fs::file_type::none : fs::status(path, error).type();
+    // A missing file is waited for when following; nothing else that cannot be reached will do.
+    const bool awaited = reader.options.follow && error == std::errc::no_such_file_or_directory;
+    if (type == fs::file_type::directory)
       AddFolder(reader, path);
+    else if (error && !awaited)
+      Fail(reader, path + ": cannot open: " + error.message());
     else
       ok &= AddSource(reader, path);
   }
@@ -306,15 +337,18 @@ int Run(int argc, char **argv) {
 
   for (Source &source : reader.sources) {
     ReadAvailable(reader, source);
-    if (reader.options.check && !source.unreadable)
-      std::printf("%s: %llu records, %llu bad lines, %llu records with bytes not UTF-8\n",
-                  source.name.c_str(), static_cast<unsigned long long>(source.records),
-                  static_cast<unsigned long long>(source.bad_lines),
-                  static_cast<unsigned long long>(source.not_utf8));
+    if (reader.options.check && !source.unreadable) {
+      const std::string summary = CheckSummary(source.name, source.counts);
+      std::fwrite(summary.data(), 1, summary.size(), stdout);
+    }
   }
   while (reader.options.follow) {
-    for (Folder &folder : reader.folders) ScanFolder(reader, folder);
-    bool any = false, open = !reader.folders.empty();
+    bool any = false;
+    bool open = false;
+    for (Folder &folder : reader.folders) {
+      ScanFolder(reader, folder);
+      open |= !folder.done;
+    }
     for (Source &source : reader.sources) {
       any |= ReadAvailable(reader, source);
       open |= !source.done;

@@ -79,6 +79,10 @@ std::optional<Options> ParseOptions(int argc, char **argv) {
     Complain("--check and --follow do not go together: a followed file has no end to sum up at");
     return std::nullopt;
   }
+  if (!WindowIsOpen(options.filter)) {
+    Complain("--since " + options.filter.since + " is after --until " + options.filter.until);
+    return std::nullopt;
+  }
   return options;
 }
 

@@ -16,8 +16,11 @@ struct RecordFilter {
 };
 
 // True for a bound in the record time's own form, YYYY-MM-DDTHH:MM:SS
-// (UTC), or for a date alone, YYYY-MM-DD.
+// (UTC), or for a date alone, YYYY-MM-DD, that names a real day and time.
 bool IsTimeBound(std::string_view text);
+
+// False when no record time can pass both bounds: `since` after `until`.
+bool WindowIsOpen(const RecordFilter &filter);
 
 // True for the four event types the library records.
 bool IsEventType(std::string_view text);

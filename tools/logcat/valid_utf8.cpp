@@ -18,7 +18,8 @@ bool InRange(std::string_view text, std::size_t i, unsigned low, unsigned high) 
 // surrogates and values above U+10FFFF.
 std::size_t SequenceLength(std::string_view text, std::size_t i) {
   const auto lead = static_cast<unsigned char>(text[i]);
-  unsigned low = 0x80, high = 0xbf;
+  unsigned low = 0x80;
+  unsigned high = 0xbf;
   std::size_t length = 0;
   if (lead >= 0xc2 && lead <= 0xdf)
     length = 2;
@@ -41,7 +42,9 @@ std::size_t SequenceLength(std::string_view text, std::size_t i) {
 } // namespace
 
 std::size_t AppendValidUtf8(std::string &out, std::string_view json) {
-  std::size_t escaped = 0, run = 0, i = 0;
+  std::size_t escaped = 0;
+  std::size_t run = 0; // start of the bytes not yet copied
+  std::size_t i = 0;
   while (i < json.size()) {
     const auto c = static_cast<std::uint8_t>(json[i]);
     if (c < 0x80) {
