@@ -154,6 +154,11 @@ void InjectBusyLock(LockResult (*lock)(platform::FileHandle, LockMode)) {
   platform::calls().sleep_milliseconds = [](int) { ++g_pauses; };
 }
 
+void NoDirectories() {
+  platform::calls().make_directory = [](const char *) { return false; };
+  platform::calls().make_private_directories = platform::calls().make_directory;
+}
+
 TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
   // clang-format off
   struct Case { // initialised: the log holds its INIT line before; records: the log after the call
@@ -170,7 +175,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
        [] { std::filesystem::remove_all(g_logs), platform::calls().open_log = OpenRacingAnotherProcess; },
        0, {kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER")}},
       {"storage cannot be made", false,
-       [] { std::filesystem::remove_all(g_logs), platform::calls().make_directory = [](const char *) { return false; }; },
+       [] { std::filesystem::remove_all(g_logs), NoDirectories(); },
        -1, {A(0, "ENTER", "SDK was never initialized. Initializing the SDK."), {2, "[OrvaneSDK] Initialize() - failed."},
             open_failed}, {}},
       {"a log that exists empty starts with INIT", false, [] { WriteFile(g_logs + "g1.log", ""); },

@@ -3,28 +3,44 @@
 #pragma once
 
 #include "core/log_channel.h"
+#include "logformat/event_types.h"
 
+#include <array>
+#include <cstddef>
 #include <cstdint>
 
 namespace orvane {
 
-// An event type and every message a call of that type can send, fixed at
+// What a call of an event type comes to; each outcome has one message per
+// type, "[OrvaneSDK] Analytics <type> - " and the outcome's own text.
+enum class Outcome {
+  kOk,
+  kGameIdEmpty,
+  kUserIdEmpty,
+  kSdkNotInitialized,
+  kOpenFailed, // followed by the game id and ")?"
+  kAlreadyInitialized,
+  kLogNotInitialized,
+  kWriteFailed,
+  kLockedOut, // the log was empty and another writer held it
+  kEncryptionFailed,
+  kTooLarge,
+  kInternalError,
+};
+inline constexpr std::size_t kOutcomeCount = 12;
+// Room for the longest message and its closing zero byte.
+inline constexpr std::size_t kEventMessageBytes = 96;
+
+// An event type and every message a call of that type can send, composed at
 // compile time so that the event path assembles no message text.
 struct EventType {
-  const char *name;
-  const char *ok;
-  const char *game_id_empty;
-  const char *user_id_empty;
-  const char *sdk_not_initialized;
-  const char *open_failed; // followed by the game id and ")?"
-  const char *already_initialized;
-  const char *log_not_initialized;
-  const char *write_failed;
-  const char *locked_out; // the log was empty and another writer held it
-  const char *encryption_failed;
-  const char *too_large;
-  const char *internal_error;
+  EventKind kind;
+  std::array<std::array<char, kEventMessageBytes>, kOutcomeCount> messages;
 };
+
+inline const char *Message(const EventType &type, Outcome outcome) {
+  return type.messages[static_cast<std::size_t>(outcome)].data();
+}
 
 extern const EventType kInitEvent;
 extern const EventType kEnterEvent;
