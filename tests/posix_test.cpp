@@ -129,9 +129,10 @@ TEST_F(PosixTest, PlatformCallsOnRealFiles) {
   platform::LockResult lock[2];
   const platform::FileHandle first = os.open_log(LogPath("g1").c_str(), lock[0], size),
                              second = os.open_log(LogPath("g1").c_str(), lock[1], size);
-  rlimit saved, full;
+  rlimit saved;
   ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
-  full = saved, full.rlim_cur = 4;
+  rlimit full = saved;
+  full.rlim_cur = 4;
   const auto previous = std::signal(SIGXFSZ, SIG_IGN);
   ::setrlimit(RLIMIT_FSIZE, &full);
   EXPECT_FALSE(os.append(first, "0123456789", 10));
@@ -183,7 +184,8 @@ TEST(StorageLocation, FollowsTheEnvironment) {
     c.xdg ? ::setenv("XDG_DATA_HOME", c.xdg, 1) : ::unsetenv("XDG_DATA_HOME");
     c.home ? ::setenv("HOME", c.home, 1) : ::unsetenv("HOME");
     const platform::StorageLocation where = platform::default_storage_location();
-    EXPECT_EQ(where.logs, c.logs);
+    EXPECT_EQ(where.logs, c.logs) << (c.xdg ? c.xdg : "no XDG_DATA_HOME") << ", "
+                                  << (c.home ? c.home : "no HOME");
     EXPECT_EQ(where.root + "Logs/", where.logs);
   }
 }
