@@ -42,10 +42,9 @@ TEST(LogChannel, DeliversToTheRegisteredCallbackOnly) {
     std::vector<std::string> heard;
   } cases[] = {
       {"heard only while registered", {Report, Register<HearA>, Register<nullptr>, Report}, {greeting("A")}},
-      {"greeted at every registration",
-       {Register<HearA>, Register<HearA>, Report},
-       {greeting("A"), greeting("A"), note("A")}},
-      {"replaced", {Register<HearA>, Register<HearB>, Report}, {greeting("A"), greeting("B"), note("B")}},
+      {"greeted at every registration; replaced",
+       {Register<HearA>, Register<HearA>, Register<HearB>, Report},
+       {greeting("A"), greeting("A"), greeting("B"), note("B")}},
       {"one that throws hears the next", {Register<HearAndThrow>, Report}, {greeting("T"), note("T")}},
       {"one that withdraws itself", {Register<HearAndWithdraw>, Report}, {greeting("W")}},
   };

@@ -23,7 +23,6 @@ TEST(CommandLine, FindsTheRestOfTheFirstArgumentWithTheMarker) {
       {{exe, U("--gameId--"), U("--gameId--g9")}, game, ""}, // the first one closes the search
       {{exe, U("--userUuid--u7--gameId--g9")}, user, "u7--gameId--g9"},
       {{exe, U("--userUuid--u7--gameId--g9")}, game, "g9"},
-      {{exe, U("--gameId--first"), U("--gameId--second")}, game, "first"},
       {{exe, U("/opt:--gameId--g9")}, game, "g9"}, // text before the marker
       {{U("C:\\--gameId--x\\demo.exe"), U("--gameId--g9")}, game, "x\\demo.exe"}, // argument 0 first
       {{exe, U("--GAMEID--g9")}, game, ""}, {{exe, U("--gameId--space race")}, game, "space race"},

@@ -64,9 +64,8 @@ TEST_F(PosixTest, OnlyTheOwnersRegularFileIsALog) {
   for (const std::string game : {"fifo", "lonely", "link", "dangling"}) {
     Captured().clear();
     EXPECT_EQ(oAnalyticsGameEnter(game.c_str(), "u1"), -1);
-    EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - log file failed to open. "
-                                                    "Maybe a bad game_id (" +
-                                                        game + ")?"}}));
+    const std::string text = "log file failed to open. Maybe a bad game_id (" + game + ")?";
+    EXPECT_EQ(Captured(), (std::vector<Message>{{2, "[OrvaneSDK] Analytics ENTER - " + text}}));
   }
   EXPECT_EQ(open_files(), before) << "a refused log leaves no descriptor open";
   ::close(reader);
@@ -186,7 +185,6 @@ TEST(StorageLocation, FollowsTheEnvironment) {
     const platform::StorageLocation where = platform::default_storage_location();
     EXPECT_EQ(where.logs, c.logs) << (c.xdg ? c.xdg : "no XDG_DATA_HOME") << ", "
                                   << (c.home ? c.home : "no HOME");
-    EXPECT_EQ(where.root + "Logs/", where.logs);
   }
 }
 

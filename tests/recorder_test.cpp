@@ -126,11 +126,6 @@ bool ShortAppend(FileHandle f, const void *d, std::size_t n) { // a full disk: a
   Os().append(f, d, n / 3);
   return false;
 }
-FileHandle OpenWithUnknownSize(const char *path, LockResult &lock, std::int64_t &size) {
-  const FileHandle f = Os().open_log(path, lock, size);
-  size = -1;
-  return f;
-}
 // Another writer records while this one writes: into an empty log, or one
 // torn (g_tear), not yet cut back.
 bool g_tear;
@@ -221,8 +216,6 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
        [] { cipher::backend().encrypt = [](Session *, const std::uint8_t *, std::size_t, std::uint8_t *) {
               return std::ptrdiff_t{-1}; }; }, -1,
        {A(2, "ENTER", "failed. Record encryption failed.")}, {Rec("INIT")}},
-      {"size unknown at the open", kStarted, [] { Live().open_log = OpenWithUnknownSize; },
-       -1, {write_failed}, {Rec("INIT")}},
       {"size unknown under the lock", kNoLog,
        [] { Live().file_size = [](FileHandle) { return std::int64_t{-1}; }; }, -1, {write_failed}},
       {"empty log locked by another writer past the deadline", kNoLog, [] { InjectBusyLock(BusyLock); },
@@ -237,6 +230,9 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
        {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
       {"... a torn first line stays: cutting it may cut another's line", kNoLog, [] { NoLocks(ShortAppend); },
        -1, {kNeverInitialized, init_write_failed, write_failed}, {kTorn}},
+      {"locks that fail during the wait: the log starts all the same", kNoLog,
+       [] { Live().try_lock_file = [](FileHandle, LockMode) { return LockResult::kFailed; }; }, 0,
+       {kNeverInitialized, init_ok, ok}, {Rec("INIT"), Rec("ENTER")}},
       {"an exception under the lock gives lock and file back", kNoLog,
        [] { Live().append = [](FileHandle, const void *, std::size_t) -> bool { throw std::bad_alloc(); }; },
        -1, {kNeverInitialized, A(2, "ENTER", "failed. Internal error.")}},

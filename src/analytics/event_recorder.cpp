@@ -225,7 +225,7 @@ bool LockWithinDeadline(LogFile &log) {
   const platform::Calls &os = platform::calls();
   const std::int64_t deadline = os.steady_milliseconds() + kLockWaitMilliseconds;
   for (;;) {
-    if (log.lock == platform::LockResult::kFailed || log.exclusive) return true;
+    if (log.exclusive) return true;
     if (log.lock == platform::LockResult::kLocked) {
       if (log.size != 0) return true;
       log.lock = os.try_lock_file(log.handle, platform::LockMode::kExclusive);
