@@ -1,6 +1,8 @@
 // The log format, byte for byte: time stamp, record text, key text, hex.
 #include "logformat/hex.h"
 #include "logformat/key_text.h"
+#include "logformat/log_lines.h"
+#include "logformat/record_json.h"
 #include "logformat/record_text.h"
 #include "logformat/timestamp.h"
 #include "support/test_support.h"
@@ -70,6 +72,22 @@ TEST(LogFormat, HexBothWays) {
     EXPECT_FALSE(DecodeHex(bad, decoded)) << bad;
     EXPECT_EQ(IsLowerHex(bad), bad == "0") << bad;
   }
+}
+
+// Lines come whole however the reads cut them, without the CR of a Windows
+// line break; a record cut inside an escape is none, whatever follows the cut.
+TEST(LogFormat, LinesAndRecordsCutAnywhere) {
+  LineSplitter lines;
+  std::vector<std::string> whole;
+  for (const std::string_view read : {"a", "b\r", "\nc\n\n", "d\r"})
+    FeedBytes(lines, read, [&](std::uint64_t n, std::string_view text) {
+      whole.push_back(std::to_string(n).append(text));
+    });
+  EXPECT_EQ(whole, (std::vector<std::string>{"1ab", "2c", "3"}));
+  EXPECT_EQ(PartialLine(lines), "d");
+  const std::string_view record = R"({"user_id":"\u0041)";
+  for (std::size_t cut = record.size() - 4; cut < record.size(); ++cut)
+    EXPECT_EQ(ParseEventRecord(record.substr(0, cut)), std::nullopt) << cut;
 }
 
 } // namespace
