@@ -16,22 +16,6 @@ namespace orvane {
 
 namespace {
 
-// Indexed by Outcome.
-constexpr std::string_view kOutcomeTexts[kOutcomeCount] = {
-    "OK",
-    "failed. Game id is empty",
-    "failed. User id is empty",
-    "SDK was never initialized. Initializing the SDK.",
-    "log file failed to open. Maybe a bad game_id (",
-    "log had been already initialized.",
-    "log was never initialized. Initialized the game log",
-    "log file failed to write.",
-    "log file is locked by another process.",
-    "failed. Record encryption failed.",
-    "failed. Record too large.",
-    "failed. Internal error.",
-};
-
 // A message that would not fit its buffer writes past it, which no
 // constant evaluation allows: the build stops.
 constexpr EventType MakeEventType(EventKind kind) {

@@ -8,6 +8,8 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
+#include <iterator>
+#include <string_view>
 
 namespace orvane {
 
@@ -27,7 +29,23 @@ enum class Outcome {
   kTooLarge,
   kInternalError,
 };
-inline constexpr std::size_t kOutcomeCount = 12;
+// Indexed by Outcome.
+inline constexpr std::string_view kOutcomeTexts[] = {
+    "OK",
+    "failed. Game id is empty",
+    "failed. User id is empty",
+    "SDK was never initialized. Initializing the SDK.",
+    "log file failed to open. Maybe a bad game_id (",
+    "log had been already initialized.",
+    "log was never initialized. Initialized the game log",
+    "log file failed to write.",
+    "log file is locked by another process.",
+    "failed. Record encryption failed.",
+    "failed. Record too large.",
+    "failed. Internal error.",
+};
+inline constexpr std::size_t kOutcomeCount = std::size(kOutcomeTexts);
+static_assert(kOutcomeCount == static_cast<std::size_t>(Outcome::kInternalError) + 1, "a text per outcome");
 // Room for the longest message and its closing zero byte.
 inline constexpr std::size_t kEventMessageBytes = 96;
 
