@@ -5,6 +5,7 @@
 // strings). As in a game, the first event's game id keys every record of the process.
 #include "analytics/game_id.h"
 #include "analytics/record_cipher.h"
+#include "logformat/event_types.h"
 #include "logformat/record_json.h"
 #include "logformat/record_text.h"
 #include "logformat/timestamp.h"
@@ -14,6 +15,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <ctime>
+#include <iterator>
 
 namespace {
 
@@ -33,8 +35,7 @@ std::string_view TakeValue(std::string_view &rest) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
   if (size == 0) return 0;
-  static constexpr std::string_view kTypes[] = {"INIT", "ENTER", "EXIT", "SPECIAL"};
-  const std::string_view type = kTypes[data[0] % 4];
+  const std::string_view type = orvane::kEventTypeNames[data[0] % std::size(orvane::kEventTypeNames)];
   std::string_view rest(reinterpret_cast<const char *>(data) + 1, size - 1);
   const std::string_view game_id = TakeValue(rest), user_id = TakeValue(rest), extra = TakeValue(rest);
   // "<id>.log" stays one name inside the folder only without a separator; a

@@ -184,7 +184,8 @@ ORVANE_API int32_t ORVANE_CALL oAnalyticsSpecial(const char *gameId, const char 
  *   - Found: a new block; every call returns a new one. Messages:
  *     (INFO, "[OrvaneSDK] Authentication - OK") or
  *     (INFO, "[OrvaneSDK] Return GameID - OK").
- *   - Not found or empty: a constant empty text "", which oFreeText ignores.
+ *   - Not found, empty, or not to be had (the command line cannot be read,
+ *     memory is exhausted): a constant empty text "", which oFreeText ignores.
  *     Messages: (ERROR, "[OrvaneSDK] Authentication - Failed") or
  *     (ERROR, "[OrvaneSDK] Return GameID - Empty").
  *

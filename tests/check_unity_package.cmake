@@ -1,5 +1,6 @@
-# cmake -DPACKAGE=dir -DBINDING=OrvaneSDK.cs -DLIBRARY=lib -DVERSION=x.y.z -P check_unity_package.cmake fails unless
-# the Unity package holds its four files, a package.json that names it and this version, and copies of what was built.
+# cmake -DPACKAGE=dir -DBINDING=OrvaneSDK.cs -DLIBRARY=lib -DVERSION=x.y.z -P check_unity_package.cmake
+# fails unless the Unity package holds its four files, a package.json that names it and this version,
+# and copies of what was built.
 string(REGEX REPLACE "^.*/|\\.[0-9.]+$" "" library ${LIBRARY}) # Unity loads libOrvaneSDK.so, unversioned
 file(GLOB_RECURSE found RELATIVE ${PACKAGE} ${PACKAGE}/*)
 file(READ ${PACKAGE}/package.json manifest)

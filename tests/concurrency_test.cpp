@@ -31,7 +31,10 @@ TEST_F(SandboxTest, ThreadsShareLogs) {
     for (int i = 0; i < kEvents; i += 2) expected.insert("shared/" + std::to_string(i));
   std::atomic<bool> done{false};
   std::thread registrar([&done] {
-    while (!done) oRegisterForLogs(Ignore), oRegisterForLogs(nullptr);
+    while (!done) {
+      oRegisterForLogs(Ignore);
+      oRegisterForLogs(nullptr);
+    }
   });
   for (std::thread &thread : running) thread.join();
   done = true;

@@ -14,28 +14,29 @@
 
 namespace orvane {
 
-#define ORVANE_EVENT_TYPE(TYPE)                                                                              \
-  {                                                                                                          \
-    TYPE, "[OrvaneSDK] Analytics " TYPE " - OK",                                                             \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Game id is empty",                                         \
-        "[OrvaneSDK] Analytics " TYPE " - failed. User id is empty",                                         \
-        "[OrvaneSDK] Analytics " TYPE " - SDK was never initialized. Initializing the SDK.",                 \
-        "[OrvaneSDK] Analytics " TYPE " - log file failed to open. Maybe a bad game_id (",                   \
-        "[OrvaneSDK] Analytics " TYPE " - log had been already initialized.",                                \
-        "[OrvaneSDK] Analytics " TYPE " - log was never initialized. Initialized the game log",              \
-        "[OrvaneSDK] Analytics " TYPE " - log file failed to write.",                                        \
-        "[OrvaneSDK] Analytics " TYPE " - log file is locked by another process.",                           \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Record encryption failed.",                                \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Record too large.",                                        \
-        "[OrvaneSDK] Analytics " TYPE " - failed. Internal error."                                           \
+namespace {
+
+// A message that would not fit its buffer writes past it, which no
+// constant evaluation allows: the build stops.
+constexpr EventType MakeEventType(EventKind kind) {
+  EventType type{kind, {}};
+  for (std::size_t outcome = 0; outcome < kOutcomeCount; ++outcome) {
+    std::array<char, kEventMessageBytes> &text = type.messages[outcome];
+    std::size_t end = 0;
+    for (const std::string_view part : {std::string_view("[OrvaneSDK] Analytics "), EventTypeName(kind),
+                                        std::string_view(" - "), kOutcomeTexts[outcome]})
+      for (const char c : part) text[end++] = c;
+    text[end] = '\0';
   }
+  return type;
+}
 
-const EventType kInitEvent = ORVANE_EVENT_TYPE("INIT");
-const EventType kEnterEvent = ORVANE_EVENT_TYPE("ENTER");
-const EventType kExitEvent = ORVANE_EVENT_TYPE("EXIT");
-const EventType kSpecialEvent = ORVANE_EVENT_TYPE("SPECIAL");
+} // namespace
 
-#undef ORVANE_EVENT_TYPE
+constexpr EventType kInitEvent = MakeEventType(EventKind::kInit);
+constexpr EventType kEnterEvent = MakeEventType(EventKind::kEnter);
+constexpr EventType kExitEvent = MakeEventType(EventKind::kExit);
+constexpr EventType kSpecialEvent = MakeEventType(EventKind::kSpecial);
 
 namespace {
 
@@ -175,7 +176,7 @@ void OpenLog(MessageBatch &messages, const Event &event, const std::string &path
   if (usable) log.handle = os.open_log(path.c_str(), log.lock, log.size);
   if (log.handle != platform::kNoFile) return;
   if (!DirectoryExists(logs.c_str())) {
-    messages.Add(LogLevel::Info, event.type.sdk_not_initialized);
+    messages.Add(LogLevel::Info, Message(event.type, Outcome::kSdkNotInitialized));
     InitializeStorage(messages);
   } else if (usable) {
     MendStorage();
@@ -184,7 +185,7 @@ void OpenLog(MessageBatch &messages, const Event &event, const std::string &path
   // same moment), the open is worth one more try once it is there.
   if (usable && DirectoryExists(logs.c_str())) log.handle = os.open_log(path.c_str(), log.lock, log.size);
   if (log.handle == platform::kNoFile) {
-    std::string text = event.type.open_failed;
+    std::string text = Message(event.type, Outcome::kOpenFailed);
     AppendPrintable(text, event.game_id);
     text += ")?";
     messages.AddOwned(LogLevel::Error, std::move(text));
@@ -208,7 +209,7 @@ bool LockWithinDeadline(LogFile &log) {
   const platform::Calls &os = platform::calls();
   const std::int64_t deadline = os.steady_milliseconds() + kLockWaitMilliseconds;
   for (;;) {
-    if (log.lock == platform::LockResult::kFailed || log.exclusive) return true;
+    if (log.exclusive) return true;
     if (log.lock == platform::LockResult::kLocked) {
       if (log.size != 0) return true;
       log.lock = os.try_lock_file(log.handle, platform::LockMode::kExclusive);
@@ -230,32 +231,31 @@ bool LockWithinDeadline(LogFile &log) {
 
 enum class Encoded { kLine, kTooLarge, kCipherFailed };
 
-// Appends the encrypted line of one record of `type` to `out`.
-Encoded EncodeLine(Workspace &space, const Event &event, const EventType &type, std::string_view time,
-                   std::string &out) {
-  // The event's own line stores what its export passed; the INIT line that
-  // a first event writes in front of it stores none.
-  const std::string_view extra = &type == &event.type ? event.extra : std::string_view();
+// Appends the encrypted line of one record of the event's game and user to
+// `out`: the event's own record, or the INIT record (with no extra) that a
+// first event writes in front of it.
+Encoded EncodeLine(Workspace &space, const Event &event, std::string_view type, std::string_view extra,
+                   std::string_view time, std::string &out) {
   // The record is at least its unescaped values and the fixed text; a record
   // too large even so is refused before it is composed.
-  const std::size_t least = kRecordFixedBytes + event.user_id.size() + event.game_id.size() +
-                            std::string_view(type.name).size() + time.size() + extra.size();
+  const std::size_t least = kRecordFixedBytes + event.user_id.size() + event.game_id.size() + type.size() +
+                            time.size() + extra.size();
   if (least > kMaxLineBytes / 2) return Encoded::kTooLarge;
   space.record.clear();
-  AppendEventRecord(space.record, event.game_id, event.user_id, type.name, time, extra);
+  AppendEventRecord(space.record, event.game_id, event.user_id, type, time, extra);
   if (2 * cipher::CiphertextSize(space.record.size()) > kMaxLineBytes) return Encoded::kTooLarge;
   if (!EncryptRecordText(space.cipher, event.key_text, space.record, out)) return Encoded::kCipherFailed;
   return Encoded::kLine;
 }
 
 const char *EncodeFailure(const EventType &type, Encoded failure) {
-  return failure == Encoded::kTooLarge ? type.too_large : type.encryption_failed;
+  return Message(type, failure == Encoded::kTooLarge ? Outcome::kTooLarge : Outcome::kEncryptionFailed);
 }
 
 std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event) {
   const platform::Calls &os = platform::calls();
   const EventType &type = event.type;
-  const bool is_init = &type == &kInitEvent;
+  const bool is_init = type.kind == EventKind::kInit;
   LogFile log;
   OpenLog(messages, event, space.path, log);
   if (log.handle == platform::kNoFile) return -1;
@@ -264,24 +264,26 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   const bool waits =
       log.lock == platform::LockResult::kBusy || (log.lock == platform::LockResult::kLocked && log.size == 0);
   if (waits && !LockWithinDeadline(log)) {
-    messages.Add(LogLevel::Error, type.locked_out);
+    messages.Add(LogLevel::Error, Message(type, Outcome::kLockedOut));
     return -1;
   }
   // A size that cannot be taken tells nothing of whether the log has its INIT
   // line: nothing is written.
   if (log.size < 0) {
-    messages.Add(LogLevel::Error, type.write_failed);
+    messages.Add(LogLevel::Error, Message(type, Outcome::kWriteFailed));
     return -1;
   }
   if (is_init && log.size != 0) {
-    messages.Add(LogLevel::Warning, type.already_initialized);
+    messages.Add(LogLevel::Warning, Message(type, Outcome::kAlreadyInitialized));
     return 0;
   }
 
   const std::string_view time = space.clock.At(os.now_seconds());
   space.line.clear();
   if (!is_init) space.line = platform::line_break();
-  if (const Encoded encoded = EncodeLine(space, event, type, time, space.line); encoded != Encoded::kLine) {
+  if (const Encoded encoded =
+          EncodeLine(space, event, EventTypeName(type.kind), event.extra, time, space.line);
+      encoded != Encoded::kLine) {
     messages.Add(LogLevel::Error, EncodeFailure(type, encoded));
     return -1;
   }
@@ -298,8 +300,9 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
     space.init_line.clear();
     if (!log.exclusive) space.init_line = platform::line_break();
     if (init_first) {
-      messages.Add(LogLevel::Warning, type.log_not_initialized);
-      if (const Encoded encoded = EncodeLine(space, event, kInitEvent, time, space.init_line);
+      messages.Add(LogLevel::Warning, Message(type, Outcome::kLogNotInitialized));
+      if (const Encoded encoded =
+              EncodeLine(space, event, EventTypeName(EventKind::kInit), {}, time, space.init_line);
           encoded != Encoded::kLine) {
         messages.Add(LogLevel::Error, EncodeFailure(kInitEvent, encoded));
         messages.Add(LogLevel::Error, EncodeFailure(type, encoded));
@@ -316,12 +319,12 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   if (!written && starts_log && log.exclusive) os.truncate_file(log.handle, 0);
   written = log.Close() && written;
   if (!written) {
-    if (init_first) messages.Add(LogLevel::Error, kInitEvent.write_failed);
-    messages.Add(LogLevel::Error, type.write_failed);
+    if (init_first) messages.Add(LogLevel::Error, Message(kInitEvent, Outcome::kWriteFailed));
+    messages.Add(LogLevel::Error, Message(type, Outcome::kWriteFailed));
     return -1;
   }
-  if (init_first) messages.Add(LogLevel::Info, kInitEvent.ok);
-  messages.Add(LogLevel::Info, type.ok);
+  if (init_first) messages.Add(LogLevel::Info, Message(kInitEvent, Outcome::kOk));
+  messages.Add(LogLevel::Info, Message(type, Outcome::kOk));
   return 0;
 }
 
@@ -333,11 +336,11 @@ std::int32_t RecordEvent(MessageBatch &messages, const char *game_id, const char
   const KeyText &key_text = TakeKeyText(game_id);
   const Event event{Text(game_id), Text(user_id), type, Text(extra), key_text};
   if (event.game_id.empty()) {
-    messages.Add(LogLevel::Error, type.game_id_empty);
+    messages.Add(LogLevel::Error, Message(type, Outcome::kGameIdEmpty));
     return -1;
   }
   if (event.user_id.empty()) {
-    messages.Add(LogLevel::Error, type.user_id_empty);
+    messages.Add(LogLevel::Error, Message(type, Outcome::kUserIdEmpty));
     return -1;
   }
   const WorkspaceLease lease;

@@ -3,28 +3,62 @@
 #pragma once
 
 #include "core/log_channel.h"
+#include "logformat/event_types.h"
 
+#include <array>
+#include <cstddef>
 #include <cstdint>
+#include <iterator>
+#include <string_view>
 
 namespace orvane {
 
-// An event type and every message a call of that type can send, fixed at
+// What a call of an event type comes to; each outcome has one message per
+// type, "[OrvaneSDK] Analytics <type> - " and the outcome's own text.
+enum class Outcome {
+  kOk,
+  kGameIdEmpty,
+  kUserIdEmpty,
+  kSdkNotInitialized,
+  kOpenFailed, // followed by the game id and ")?"
+  kAlreadyInitialized,
+  kLogNotInitialized,
+  kWriteFailed,
+  kLockedOut, // the log was empty and another writer held it
+  kEncryptionFailed,
+  kTooLarge,
+  kInternalError,
+};
+// Indexed by Outcome.
+inline constexpr std::string_view kOutcomeTexts[] = {
+    "OK",
+    "failed. Game id is empty",
+    "failed. User id is empty",
+    "SDK was never initialized. Initializing the SDK.",
+    "log file failed to open. Maybe a bad game_id (",
+    "log had been already initialized.",
+    "log was never initialized. Initialized the game log",
+    "log file failed to write.",
+    "log file is locked by another process.",
+    "failed. Record encryption failed.",
+    "failed. Record too large.",
+    "failed. Internal error.",
+};
+inline constexpr std::size_t kOutcomeCount = std::size(kOutcomeTexts);
+static_assert(kOutcomeCount == static_cast<std::size_t>(Outcome::kInternalError) + 1, "a text per outcome");
+// Room for the longest message and its closing zero byte.
+inline constexpr std::size_t kEventMessageBytes = 96;
+
+// An event type and every message a call of that type can send, composed at
 // compile time so that the event path assembles no message text.
 struct EventType {
-  const char *name;
-  const char *ok;
-  const char *game_id_empty;
-  const char *user_id_empty;
-  const char *sdk_not_initialized;
-  const char *open_failed; // followed by the game id and ")?"
-  const char *already_initialized;
-  const char *log_not_initialized;
-  const char *write_failed;
-  const char *locked_out; // the log was empty and another writer held it
-  const char *encryption_failed;
-  const char *too_large;
-  const char *internal_error;
+  EventKind kind;
+  std::array<std::array<char, kEventMessageBytes>, kOutcomeCount> messages;
 };
+
+inline const char *Message(const EventType &type, Outcome outcome) {
+  return type.messages[static_cast<std::size_t>(outcome)].data();
+}
 
 extern const EventType kInitEvent;
 extern const EventType kEnterEvent;

@@ -7,9 +7,10 @@ namespace {
 
 std::int32_t Record(const orvane::EventType &type, const char *game_id, const char *user_id,
                     const char *extra) {
-  return orvane::RunExport<std::int32_t>(-1, type.internal_error, [&](orvane::MessageBatch &messages) {
-    return orvane::RecordEvent(messages, game_id, user_id, type, extra);
-  });
+  return orvane::RunExport<std::int32_t>(
+      -1, orvane::Message(type, orvane::Outcome::kInternalError), [&](orvane::MessageBatch &messages) {
+        return orvane::RecordEvent(messages, game_id, user_id, type, extra);
+      });
 }
 
 } // namespace

@@ -77,7 +77,10 @@ void LogToHost(LogLevel level, const char *message) noexcept {
 void RegisterForLogs(LogCallback callback) noexcept {
   // Before the first registration no delivery can be under way, so this is
   // early enough for every fork that could inherit one.
-  static const bool fork_handled = (platform::RunInForkedChildren(ForgetOtherThreadsDeliveries), true);
+  static const bool fork_handled = [] {
+    platform::RunInForkedChildren(ForgetOtherThreadsDeliveries);
+    return true;
+  }();
   static_cast<void>(fork_handled);
   g_callback.store(callback, std::memory_order_seq_cst);
   WaitForEarlierDeliveries();

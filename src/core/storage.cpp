@@ -33,18 +33,13 @@ bool DirectoryExists(const char *path) { return path[0] != '\0' && platform::cal
 
 void InitializeStorage(MessageBatch &messages) {
   const platform::StorageLocation &where = Storage();
-  const platform::Calls &os = platform::calls();
   if (!DirectoryExists(where.logs.c_str())) {
-    if (!DirectoryExists(where.root.c_str())) {
-      // The base stands where Windows has its drive root; it is created only
-      // when missing, like a fresh account's ~/.local/share.
-      if (!where.base.empty() && !DirectoryExists(where.base.c_str()))
-        os.make_private_directories(where.base.c_str());
-    }
-    // Also when the root is there: it may be one that an earlier run left
-    // without its owner's rights, in which no logs directory can be made.
-    if (!where.root.empty()) os.make_directory(where.root.c_str());
-    if (!where.logs.empty()) os.make_directory(where.logs.c_str());
+    // The library's own levels first: a root that an earlier run left
+    // without its owner's rights takes no logs directory. Then every level
+    // still missing, the base's parents included, like a fresh account's
+    // ~/.local/share.
+    MendStorage();
+    if (!where.logs.empty()) platform::calls().make_private_directories(where.logs.c_str());
     // Report what the disk shows, not what was attempted: a creation that
     // failed must not read as success.
     if (!DirectoryExists(where.logs.c_str())) {

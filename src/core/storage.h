@@ -15,7 +15,8 @@ void SetStorageForTesting(platform::StorageLocation where);
 
 bool DirectoryExists(const char *path);
 
-// Creates the root and logs directories where they are missing and adds
+// Where the logs directory is missing, mends the root and logs directories
+// and creates every level still missing, then adds
 // "Initialize() - OK." or, when the logs directory is still missing,
 // "Initialize() - failed." to `messages`.
 void InitializeStorage(MessageBatch &messages);

@@ -52,13 +52,14 @@ char *LookUpIdentity(MessageBatch &messages, const IdentityLookup &lookup) {
   const std::string value = read ? FindValueAfterMarker(args, lookup.marker) : std::string();
   // A value whose first byte is zero would read as empty text in a block
   // that the host must free, while an empty result must never be freed:
-  // such a value counts as not found, so that the rule stays exact.
-  if (value.empty() || value[0] == '\0') {
+  // such a value counts as not found, so that the rule stays exact. A block
+  // that cannot be had (memory exhausted) is reported the same way.
+  char *const block =
+      value.empty() || value[0] == '\0' ? nullptr : static_cast<char *>(std::malloc(value.size() + 1));
+  if (block == nullptr) {
     messages.Add(LogLevel::Error, lookup.not_found);
     return empty;
   }
-  char *block = static_cast<char *>(std::malloc(value.size() + 1));
-  if (block == nullptr) return empty;
   // The text ends at the value's first zero byte, as a C string would.
   const std::size_t length = std::strlen(value.c_str());
   std::memcpy(block, value.data(), length);

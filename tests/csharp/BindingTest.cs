@@ -11,11 +11,13 @@ static class BindingTest {
     static readonly string data = Path.GetTempPath() + "orvane-csharp-" + Guid.NewGuid().ToString("N");
 
     static void Equal<T>(T expected, T got, string what) {
-        if (!Equals(expected, got)) throw new Exception(what + "\n  expected: " + expected + "\n  got:      " + got);
+        if (!Equals(expected, got))
+            throw new Exception(what + "\n  expected: " + expected + "\n  got:      " + got);
     }
 
     static int Main(string[] args) {
-        Environment.SetEnvironmentVariable("XDG_DATA_HOME", Directory.CreateDirectory(data).FullName); // read at load
+        // Read when the library loads.
+        Environment.SetEnvironmentVariable("XDG_DATA_HOME", Directory.CreateDirectory(data).FullName);
         try { Reload(); Example(args[0], args[1]); return 0; }
         catch (Exception e) { Console.WriteLine("FAILED: " + e.Message); return 1; }
         finally { Directory.Delete(data, true); }
@@ -34,32 +36,38 @@ static class BindingTest {
             OrvaneSDK.AnalyticsSpecial(game, user, "before\0after"), // a NUL: refused, never stored cut
             OrvaneSDK.AnalyticsGameExit(game + "\0x", user)), "identity, results");
         OrvaneSDK.Initialize();
-        Equal("ILogging initiated.|IAuthentication - OK|IReturn GameID - OK|IAnalytics ENTER - SDK was never " +
-              "initialized. Initializing the SDK.|IInitialize() - OK.|WAnalytics ENTER - log was never initialized. " +
-              "Initialized the game log|IAnalytics INIT - OK|IAnalytics ENTER - OK|WAnalytics INIT - log had been " +
-              "already initialized.|IAnalytics SPECIAL - OK|IAnalytics EXIT - OK|EAnalytics ENTER - failed. Game id " +
-              "is empty|EAnalytics SPECIAL - failed. Text holds a NUL character.|EAnalytics EXIT - failed. " +
-              "Text holds a NUL character.|IInitialize() - OK.", string.Join("|", heard), "messages, level first");
-        var run = new ProcessStartInfo(logcat, data + "/Orvane/Logs/demo42.log") {UseShellExecute = false,
-            RedirectStandardOutput = true, StandardOutputEncoding = System.Text.Encoding.UTF8};
+        Equal("ILogging initiated.|IAuthentication - OK|IReturn GameID - OK|IAnalytics ENTER - SDK was " +
+              "never initialized. Initializing the SDK.|IInitialize() - OK.|WAnalytics ENTER - log was " +
+              "never initialized. Initialized the game log|IAnalytics INIT - OK|IAnalytics ENTER - OK|" +
+              "WAnalytics INIT - log had been already initialized.|IAnalytics SPECIAL - OK|" +
+              "IAnalytics EXIT - OK|EAnalytics ENTER - failed. Game id is empty|EAnalytics SPECIAL - " +
+              "failed. Text holds a NUL character.|EAnalytics EXIT - failed. Text holds a NUL character.|" +
+              "IInitialize() - OK.", string.Join("|", heard), "messages, level first");
+        var run = new ProcessStartInfo(logcat, data + "/Orvane/Logs/demo42.log") {
+            UseShellExecute = false, RedirectStandardOutput = true,
+            StandardOutputEncoding = System.Text.Encoding.UTF8};
         Process reader = Process.Start(run);
-        string records = Regex.Replace(reader.StandardOutput.ReadToEnd(), @"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d", "T");
+        string records =
+            Regex.Replace(reader.StandardOutput.ReadToEnd(), @"\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d", "T");
         reader.WaitForExit();
-        Func<string, string, string> line = (type, text) => "{\"user_id\":\"a1b2c3d4\",\"game_id\":\"demo42\"," +
-            "\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" + text.Replace("\"", "\\\"") + "\"}\n";
+        Func<string, string, string> line = (type, text) => "{\"user_id\":\"a1b2c3d4\"," +
+            "\"game_id\":\"demo42\",\"type\":\"" + type + "\",\"time\":\"T\",\"extra\":\"" +
+            text.Replace("\"", "\\\"") + "\"}\n";
         Equal(line("INIT", "") + line("ENTER", "") + line("SPECIAL", extra) + line("EXIT", "") + 0,
               records + reader.ExitCode, "the log read back by orvane-logcat, and its exit status");
     }
 
-    // First, a script domain registers and is unloaded, as Unity's Editor reloads scripts: the binding
-    // withdraws the handler first, so a message from the main domain neither calls into the unloaded
-    // code nor reaches it.
+    // First, a script domain registers and is unloaded, as Unity's Editor reloads scripts: the
+    // binding withdraws the handler first, so a message from the main domain neither calls into the
+    // unloaded code nor reaches it.
     static void Reload() {
         AppDomain scripts = AppDomain.CreateDomain("scripts");
-        scripts.DoCallBack(() => OrvaneSDK.RegisterForLogs((level, message) => // where `data` is another path
-            File.AppendAllText(Environment.GetEnvironmentVariable("XDG_DATA_HOME") + "/heard", message + "\n")));
+        // There `data` is another path.
+        scripts.DoCallBack(() => OrvaneSDK.RegisterForLogs((level, message) => File.AppendAllText(
+            Environment.GetEnvironmentVariable("XDG_DATA_HOME") + "/heard", message + "\n")));
         AppDomain.Unload(scripts);
         Equal(-1, OrvaneSDK.AnalyticsGameEnter("", "u1"), "a call with a message after the unload");
-        Equal("[OrvaneSDK] Logging initiated.\n", File.ReadAllText(data + "/heard"), "what the handler heard");
+        Equal("[OrvaneSDK] Logging initiated.\n", File.ReadAllText(data + "/heard"),
+              "what the handler heard");
     }
 }

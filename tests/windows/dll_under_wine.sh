@@ -15,13 +15,15 @@ oAuthGetUserUuid oFreeText oGetVersion oInitialize oRegisterForLogs" ] || fail "
 imports=$(sed -n 's/^\tDLL Name: //p' <<<"$table" | tr A-Z a-z | sort | xargs)
 [ "$imports" = "bcrypt.dll kernel32.dll msvcrt.dll shell32.dll" ] || fail "imports: $imports"
 resource=$("$windres" -i "$dll" -O rc)
-[[ $resource == *"FILEVERSION ${version//./, }, 0"*'"ProductName", "OrvaneSDK"'*"\"ProductVersion\", \"$version\""* ]] ||
+product='"ProductName", "OrvaneSDK"'
+[[ $resource == *"FILEVERSION ${version//./, }, 0"*$product*"\"ProductVersion\", \"$version\""* ]] ||
   fail "version resource: $resource"
 
 rm -rf "$prefix/drive_c/Orvane"
-output=$(bash "$(dirname "$0")/wine_run.sh" "$prefix" "$host" uuid gameid enter g1 u1 special g1 u1 score=10 \
-  -- "--userUuid--a1b2 c3d4" "--gameId--space race") || fail "orvane-host.exe: $output"
-[[ $output == *'oAuthGetUserUuid() = "a1b2 c3d4"'*'oAuthGetGameId() = "space race"'* ]] || fail "identity: $output"
+output=$(bash "$(dirname "$0")/wine_run.sh" "$prefix" "$host" uuid gameid enter g1 u1 special g1 u1 \
+  score=10 -- "--userUuid--a1b2 c3d4" "--gameId--space race") || fail "orvane-host.exe: $output"
+[[ $output == *'oAuthGetUserUuid() = "a1b2 c3d4"'*'oAuthGetGameId() = "space race"'* ]] ||
+  fail "identity: $output"
 # CR LF between lines, none at the end, nothing else but hex digits.
 log=$prefix/drive_c/Orvane/Logs/g1.log
 [ "$(tr '\r\n' '<>' <"$log" | tr -d 0-9a-f)" = '<><>' ] || fail "$log: $(od -c "$log")"

@@ -199,11 +199,20 @@ std::string HomeDirectory() {
 }
 
 const Calls kPosixCalls = {
-    DirectoryExistsPosix,   MakeDirectoryPosix, MakePrivateDirectoriesPosix,
-    OpenLogPosix,           FileSizePosix,      AppendPosix,
-    TruncateFilePosix,      CloseFilePosix,     TryLockFilePosix,
-    UnlockFilePosix,        NowSecondsPosix,    SteadyMillisecondsPosix,
-    SleepMillisecondsPosix, ArgumentListPosix,
+    .directory_exists = DirectoryExistsPosix,
+    .make_directory = MakeDirectoryPosix,
+    .make_private_directories = MakePrivateDirectoriesPosix,
+    .open_log = OpenLogPosix,
+    .file_size = FileSizePosix,
+    .append = AppendPosix,
+    .truncate_file = TruncateFilePosix,
+    .close_file = CloseFilePosix,
+    .try_lock_file = TryLockFilePosix,
+    .unlock_file = UnlockFilePosix,
+    .now_seconds = NowSecondsPosix,
+    .steady_milliseconds = SteadyMillisecondsPosix,
+    .sleep_milliseconds = SleepMillisecondsPosix,
+    .argument_list = ArgumentListPosix,
 };
 
 Calls g_calls = kPosixCalls;

@@ -178,11 +178,20 @@ bool ArgumentListWindows(ArgumentList &args) {
 }
 
 const Calls kWindowsCalls = {
-    DirectoryExistsWindows,   MakeDirectoryWindows, MakePrivateDirectoriesWindows,
-    OpenLogWindows,           FileSizeWindows,      AppendWindows,
-    TruncateFileWindows,      CloseFileWindows,     TryLockFileWindows,
-    UnlockFileWindows,        NowSecondsWindows,    SteadyMillisecondsWindows,
-    SleepMillisecondsWindows, ArgumentListWindows,
+    .directory_exists = DirectoryExistsWindows,
+    .make_directory = MakeDirectoryWindows,
+    .make_private_directories = MakePrivateDirectoriesWindows,
+    .open_log = OpenLogWindows,
+    .file_size = FileSizeWindows,
+    .append = AppendWindows,
+    .truncate_file = TruncateFileWindows,
+    .close_file = CloseFileWindows,
+    .try_lock_file = TryLockFileWindows,
+    .unlock_file = UnlockFileWindows,
+    .now_seconds = NowSecondsWindows,
+    .steady_milliseconds = SteadyMillisecondsWindows,
+    .sleep_milliseconds = SleepMillisecondsWindows,
+    .argument_list = ArgumentListWindows,
 };
 
 Calls g_calls = kWindowsCalls;
