@@ -10,6 +10,7 @@
 #include "standard_input.h"
 
 #include "cipher/cipher.h"
+#include "logformat/event_types.h"
 
 #include <cerrno>
 #include <chrono>
@@ -166,7 +167,7 @@ bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_
     return false;
   }
   // Every log the library starts begins with its INIT record.
-  if (first && reader.options.check && reader.record.type != "INIT") {
+  if (first && reader.options.check && reader.record.type != EventTypeName(EventKind::kInit)) {
     ReportBadLine(reader, source, number, "first record is not INIT");
     return true;
   }

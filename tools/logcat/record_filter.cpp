@@ -1,6 +1,9 @@
 #include "record_filter.h"
 
+#include "logformat/event_types.h"
+
 #include <algorithm>
+#include <iterator>
 
 namespace orvane::logcat {
 namespace {
@@ -41,7 +44,7 @@ bool WindowIsOpen(const RecordFilter &filter) {
 }
 
 bool IsEventType(std::string_view text) {
-  return text == "INIT" || text == "ENTER" || text == "EXIT" || text == "SPECIAL";
+  return std::find(std::begin(kEventTypeNames), std::end(kEventTypeNames), text) != std::end(kEventTypeNames);
 }
 
 bool Passes(const RecordFilter &filter, const EventRecord &record) {
