@@ -19,12 +19,6 @@ TEST(Cipher, KnownAnswers) {
        R"({"user_id":"u1","game_id":"g1","type":"ENTER","time":"2024-05-17T08:30:00","extra":""})",
        "b1659727c7a378f68090dc51236637118f565656c8d9f70e68a503fc43aaea708ae947655772e282f2132e502b85a091"
        "417bd170bbbd8bac46222e07d0e1e2973775ff64bff0330386e99052b613ad63c6951b05a386434b823a218fe0c03dd5"},
-      {KeyTextFor(std::string(65, 'x')),
-       R"({"user_id":"user-42","game_id":"1234","type":"SPECIAL",)"
-       R"("time":"2024-05-17T08:30:00","extra":"level=3"})",
-       "bffd380268c33ed3d08eb69a124d3831ff35bbae67b647d571fbdf4f32037dd98cb52a7eeffd4c226f9c751b30c0824e"
-       "b96c4310f821543154b1b52d4c9dda1a930aa85471ae2992dc9aca4dd35c98d5c87377f5cd69e2d982f6af5ce4b36414"
-       "5898c857f6f900202b2b18523dfe62a5"},
       {KeyTextFor("abcdefghijklmnopq"), "0123456789abcdef", // a whole block of padding
        "e7b8feea738abf9917e02f3660c47cda9fee3c8637a8152d07506057eb38f7ff"},
   };
@@ -54,7 +48,7 @@ TEST(Cipher, KnownAnswers) {
 // Lengths around the block size, the old 1023-byte limit and far past it.
 TEST(Cipher, EveryLengthDecryptsWhole) {
   const KeyText &key_text = TakeKeyText("g1");
-  const std::string key = KeyString(key_text);
+  const std::string key = KeyTextFor("g1");
   RecordCipher state;
   for (std::size_t length : {0, 1, 15, 16, 95, 96, 1023, 1024, 65536}) {
     std::string record(length, '\0'), hex;
