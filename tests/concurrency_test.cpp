@@ -39,7 +39,8 @@ TEST_F(SandboxTest, ThreadsShareLogs) {
   for (std::thread &thread : running) thread.join();
   done = true;
   registrar.join();
-  const std::string key = KeyString(TakeKeyText(nullptr)); // the first event's
+  const KeyText &first = TakeKeyText(nullptr); // the first event's
+  const std::string key(first.begin(), first.end());
   for (int t = 0; t <= kThreads; ++t) {
     const std::string game = t < kThreads ? "own-" + std::to_string(t) : "shared";
     const std::vector<std::string> records = Records(LogPath(game), key);

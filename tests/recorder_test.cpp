@@ -26,7 +26,7 @@ namespace {
 class RecorderTest : public SandboxTest {
 protected:
   std::vector<std::string> Log() { // under the key of the first game id of this process
-    return Records(LogPath("g1"), KeyString(TakeKeyText(nullptr)));
+    return Records(LogPath("g1"), KeyTextFor("g1"));
   }
 };
 
@@ -36,11 +36,6 @@ std::string Rec(const std::string &type, const std::string &extra = "") {
 // A message of an analytics export: level 0 Info, 1 Warning, 2 Error.
 Message A(int level, const std::string &type, const std::string &text) {
   return {level, "[OrvaneSDK] Analytics " + type + " - " + text};
-}
-std::string Repeat(const std::string &text, int times) {
-  std::string out;
-  while (times-- > 0) out += text;
-  return out;
 }
 const Message kSdkNeverInitialized = A(0, "ENTER", "SDK was never initialized. Initializing the SDK.");
 const Message kNeverInitialized = A(1, "ENTER", "log was never initialized. Initialized the game log");
@@ -91,12 +86,14 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
   std::filesystem::create_directories(where_.logs);
   // Which ids are refused is the game-id rule's test. An id is shown up to
   // its first 256 bytes, counted before escaping.
+  std::string escaped;
+  while (escaped.size() < 256 * 4) escaped += "\\x01";
   // clang-format off
   const std::pair<std::string, std::string> hostile[] = {
       {"../x", "../x"}, {"CON", "CON"}, {"t\tb\x7f", "t\\x09b\\x7f"},
       {"x\n[OrvaneSDK] y - OK\x1b[2K", "x\\x0a[OrvaneSDK] y - OK\\x1b[2K"},
       {std::string(256, 'a'), std::string(256, 'a')}, {std::string(257, 'a'), std::string(256, 'a') + "..."},
-      {std::string(1 << 20, '\x01'), Repeat("\\x01", 256) + "..."}};
+      {std::string(1 << 20, '\x01'), escaped + "..."}};
   // clang-format on
   for (const auto &[id, shown] : hostile) {
     Captured().clear();

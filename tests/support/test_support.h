@@ -33,9 +33,6 @@ std::vector<std::string> Split(std::string_view text, std::string_view separator
 // The lines of a log (platform line breaks), each decrypted with its time
 // stamp replaced by "T", or "(undecryptable)"; empty lines skipped.
 std::vector<std::string> Records(const std::string &log, const std::string &key_text);
-inline std::string KeyString(const KeyText &key_text) {
-  return std::string(key_text.begin(), key_text.end());
-}
 
 // Gives back the platform table and the cipher backend as they were, so
 // that no fake outlives its test, a failed ASSERT included.
