@@ -105,7 +105,6 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
 }
 
 // Faults injected into single platform and cipher calls.
-const platform::Calls &Os() { return platform::native_calls(); }
 platform::Calls &Live() { return platform::calls(); }
 using cipher::Session;
 using platform::FileHandle;
@@ -115,22 +114,22 @@ std::string g_logs;
 std::int64_t g_now_ms;
 // Another process makes the logs directory while this open fails.
 FileHandle OpenRacingAnotherProcess(const char *path, LockResult &lock, std::int64_t &size) {
-  if (std::filesystem::exists(g_logs)) return Os().open_log(path, lock, size);
+  if (std::filesystem::exists(g_logs)) return os.open_log(path, lock, size);
   std::filesystem::create_directories(g_logs);
   return platform::kNoFile;
 }
 bool ShortAppend(FileHandle f, const void *d, std::size_t n) { // a full disk: a third goes in
-  Os().append(f, d, n / 3);
+  os.append(f, d, n / 3);
   return false;
 }
 // Another writer records while this one writes: into an empty log, or one
 // torn (g_tear), not yet cut back.
 bool g_tear;
 bool AnotherRecordsMeanwhile(FileHandle f, const void *d, std::size_t n) {
-  Live().append = Os().append;
-  if (g_tear) Os().append(f, d, n / 3);
+  Live().append = os.append;
+  if (g_tear) os.append(f, d, n / 3);
   oAnalyticsGameEnter("g1", "u1");
-  return !g_tear && Os().append(f, d, n);
+  return !g_tear && os.append(f, d, n);
 }
 void TearWhileAnotherRecords() { // the other writer's wait ends at the first reading of its deadline
   g_tear = true;
@@ -139,7 +138,7 @@ void TearWhileAnotherRecords() { // the other writer's wait ends at the first re
 }
 void NoLocks(bool (*append)(FileHandle, const void *, std::size_t)) {
   Live().open_log = [](const char *path, LockResult &lock, std::int64_t &size) {
-    const FileHandle f = Os().open_log(path, lock, size);
+    const FileHandle f = os.open_log(path, lock, size);
     lock = LockResult::kFailed;
     return f;
   };
@@ -156,12 +155,12 @@ LockResult BusyLock(FileHandle, LockMode) {
 }
 // Holds it at the first try, to start the log, then is gone.
 LockResult RivalStartsTheLog(FileHandle file, LockMode mode) {
-  if (g_lock_tries++ > 0) return Os().try_lock_file(file, mode);
+  if (g_lock_tries++ > 0) return os.try_lock_file(file, mode);
   std::int64_t size = 0;
   LockResult lock;
-  const FileHandle rival = Os().open_log((g_logs + "g1.log").c_str(), lock, size);
-  if (size == 0) Os().append(rival, "rival-init", 10);
-  Os().close_file(rival);
+  const FileHandle rival = os.open_log((g_logs + "g1.log").c_str(), lock, size);
+  if (size == 0) os.append(rival, "rival-init", 10);
+  os.close_file(rival);
   return LockResult::kBusy;
 }
 void InjectBusyLock(LockResult (*lock)(FileHandle, LockMode)) {
@@ -207,7 +206,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
       {"... and no other writer can have written behind it meanwhile", kNoLog, TearWhileAnotherRecords,
        -1, {busy, kNeverInitialized, init_write_failed, write_failed}},
       {"close fails", kStarted,
-       [] { Live().close_file = [](FileHandle f) { return Os().close_file(f) && false; }; }, -1,
+       [] { Live().close_file = [](FileHandle f) { return os.close_file(f) && false; }; }, -1,
        {write_failed}, {Rec("INIT"), Rec("ENTER")}},
       {"cipher fails", kStarted,
        [] { cipher::backend().encrypt = [](Session *, const std::uint8_t *, std::size_t, std::uint8_t *) {
@@ -262,8 +261,6 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     EXPECT_EQ(Log().back(), Rec("EXIT"));
   }
 }
-
-void ORVANE_CALL Ignore(LogLevel, const char *) {}
 
 // An ordinary event takes an idle workspace, whose buffers an earlier event
 // sized, and allocates nothing. (The benchmark counts the cipher's own too.)

@@ -45,6 +45,10 @@ struct CallsGuard {
   }
 };
 
+// The platform's own calls, whatever fake the table holds.
+inline const platform::Calls &os = platform::native_calls();
+void ORVANE_CALL Ignore(LogLevel level, const char *message);
+
 // An empty data directory and a capturing callback for each test.
 class SandboxTest : public ::testing::Test {
 protected:
