@@ -2,7 +2,6 @@
 // length decrypted by the independent oracle.
 #include "analytics/record_cipher.h"
 #include "logformat/hex.h"
-#include "logformat/key_text.h"
 #include "support/test_support.h"
 
 namespace orvane::testing {

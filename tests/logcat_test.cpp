@@ -4,7 +4,6 @@
 #include "help_text.h"
 #include "key_discovery.h"
 #include "logformat/hex.h"
-#include "logformat/key_text.h"
 #include "record_filter.h"
 #include "support/test_support.h"
 #include "valid_utf8.h"
@@ -174,11 +173,10 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   // clang-format off
   const std::pair<std::vector<std::string>, std::string> runs[] = {
       {{logs_}, a + b}, {{logs_ + "gB.log", "--", logs_ + "gB.log"}, b},
-      {{"--show-key", logs_}, Printed("gA", ids, false, true) + Printed("gB", ids, false, true)},
-      {{"--with-file", logs_ + "gA.log"}, Printed("gA", ids, true)}, {{}, a + b}, // none: the default folder
+      {{"--show-key", "--with-file", logs_}, Printed("gA", ids, true, true) + Printed("gB", ids, true, true)},
       {{"--type", "INIT", "--type=EXIT", "--type=SPECIAL", logs_},
        Split(a, "\n")[0] + "\n" + Split(a, "\n")[2] + "\n" + lb[0] + "\n" + lb[3] + "\n"},
-      {{"--since=2999-01-01T00:00:00", logs_}, ""},
+      {{"--since=2999-01-01T00:00:00", logs_}, ""}, {{}, a + b}, // {}: the default folder
       {{"--until", "2000-01-01", "--since", "2000-01-01", logs_}, ""},
       {{"--since", first, "--until=" + day, logs_}, a + b}, // bounds hold their own second and day
       {{"--check", logs_}, logs_ + "gA.log: 3 records, 0 bad lines, 0 records with bytes not UTF-8\n" +

@@ -1,7 +1,6 @@
 // The event log through the analytics exports: messages in order, results,
 // and the bytes of the log file, with faults injected into single calls.
 #include "OrvaneSDK.h"
-#include "analytics/record_cipher.h"
 #include "core/storage.h"
 #include "support/test_support.h"
 
