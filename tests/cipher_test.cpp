@@ -53,8 +53,7 @@ TEST(Cipher, EveryLengthDecryptsWhole) {
     ASSERT_TRUE(EncryptRecordText(state, key_text, record, hex));
     EXPECT_EQ(DecryptLine(hex, key), record) << length;
   }
-  // A failure writes nothing; a session that could not be made is made again for the next record. (A
-  // failed encryption: the recorder's fault table.)
+  // A failure writes nothing; a session that could not be made is made again for the next record.
   RecordCipher fresh;
   std::string hex = "kept";
   {
