@@ -56,13 +56,10 @@ TEST_F(RecorderTest, ALogFromItsFirstEventOn) {
   oRegisterForLogs(RecordFromInside);
   Captured().clear();
   EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  EXPECT_EQ(Captured(), (std::vector<Message>{kSdkNeverInitialized,
-                                              {0, "[OrvaneSDK] Initialize() - OK."},
-                                              kNeverInitialized,
-                                              A(0, "EXIT", "OK"),
-                                              {0, "nested 0"},
-                                              A(0, "INIT", "OK"),
-                                              A(0, "ENTER", "OK")}));
+  EXPECT_EQ(Captured(),
+            (std::vector<Message>{kSdkNeverInitialized, Message{0, "[OrvaneSDK] Initialize() - OK."},
+                                  kNeverInitialized, A(0, "EXIT", "OK"), Message{0, "nested 0"},
+                                  A(0, "INIT", "OK"), A(0, "ENTER", "OK")}));
   EXPECT_EQ(Split(*ReadFile(LogPath("g1")), "\n").size(), 3u) << "line breaks only between lines";
   Captured().clear();
   EXPECT_EQ(oAnalyticsInit("g1", "u1"), 0);
