@@ -36,11 +36,11 @@ static class BindingTest {
             OrvaneSDK.AnalyticsSpecial(game, user, "before\0after"), // a NUL: refused, never stored cut
             OrvaneSDK.AnalyticsGameExit(game + "\0x", user)), "identity, results");
         OrvaneSDK.Initialize();
-        // Every message and its order are the recorder's tests' concern: here one of each level arrives
-        // with it, and the refusals of a NUL.
-        Equal("ILogging initiated.|WAnalytics INIT - log had been already initialized.|EAnalytics SPECIAL - " +
-              "failed. Text holds a NUL character.|EAnalytics EXIT - failed. Text holds a NUL character.|15",
-              string.Join("|", heard[0], heard[8], heard[12], heard[13], heard.Count), "messages, level first");
+        // A message of each level arrives with it, and the NUL refusals; the order is the recorder's.
+        Equal("ILogging initiated.|WAnalytics INIT - log had been already initialized.|EAnalytics " +
+              "SPECIAL - failed. Text holds a NUL character.|EAnalytics EXIT - failed. Text holds a NUL " +
+              "character.|15", string.Join("|", heard[0], heard[8], heard[12], heard[13], heard.Count),
+              "messages, level first");
         var run = new ProcessStartInfo(logcat, data + "/Orvane/Logs/demo42.log") {
             UseShellExecute = false, RedirectStandardOutput = true,
             StandardOutputEncoding = System.Text.Encoding.UTF8};
