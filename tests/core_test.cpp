@@ -54,7 +54,6 @@ TEST(LogChannel, DeliversToTheRegisteredCallbackOnly) {
     for (void (*step)() : c.steps) step();
     EXPECT_EQ(g_heard, c.heard) << c.name;
   }
-  oRegisterForLogs(nullptr);
 }
 
 // A registration waits for the other threads' deliveries that began before it
@@ -84,7 +83,6 @@ TEST(LogChannel, ReplacingWaitsOnlyForEarlierDeliveries) {
   EXPECT_EQ(g_inside_a, 0);
   g_relaying = false;
   for (std::thread *reporter : {&first, &second}) reporter->join();
-  oRegisterForLogs(nullptr);
 }
 
 } // namespace

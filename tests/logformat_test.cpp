@@ -2,7 +2,6 @@
 #include "logformat/hex.h"
 #include "logformat/key_text.h"
 #include "logformat/log_lines.h"
-#include "logformat/record_json.h"
 #include "logformat/record_text.h"
 #include "logformat/timestamp.h"
 #include "support/test_support.h"
@@ -13,11 +12,10 @@ namespace {
 TEST(LogFormat, TimeStampOfFixedInstants) {
   // clang-format off
   const std::pair<std::int64_t, const char *> cases[] = {
-      {0, "1970-01-01T00:00:00"}, {1700000000, "2023-11-14T22:13:20"}, {-1, "1969-12-31T23:59:59"},
-      {1709622489, "2024-03-05T07:08:09"}, {1704067199, "2023-12-31T23:59:59"},
-      {1704067200, "2024-01-01T00:00:00"}, {951782400, "2000-02-29T00:00:00"},
+      {0, "1970-01-01T00:00:00"}, {-1, "1969-12-31T23:59:59"}, {-86400, "1969-12-31T00:00:00"},
+      {1709622489, "2024-03-05T07:08:09"}, {1704067200, "2024-01-01T00:00:00"},
+      {951782400, "2000-02-29T00:00:00"}, {4107542400, "2100-03-01T00:00:00"},
       {1704067140, "2023-12-31T23:59:00"}, // minute 59: seconds of the hour / 60, not 61
-      {4107542400, "2100-03-01T00:00:00"}, {-86400, "1969-12-31T00:00:00"},
       {951868800, "2000-03-01T00:00:00"}, {1709622000, "2024-03-05T07:00:00"}, // a 400-year era; an hour
       {253402300800, "10000-01-01T00:00:00"}}; // a fifth digit is kept, not cut
   // clang-format on
@@ -75,8 +73,8 @@ TEST(LogFormat, HexBothWays) {
 }
 
 // Lines come whole however the reads cut them, without the CR of a Windows
-// line break; a record cut inside an escape is none, whatever follows the cut.
-TEST(LogFormat, LinesAndRecordsCutAnywhere) {
+// line break.
+TEST(LogFormat, LinesCutAnywhere) {
   LineSplitter lines;
   std::vector<std::string> whole;
   for (const std::string_view read : {"a", "b\r", "\nc\n\n", "d\r"})
@@ -85,9 +83,6 @@ TEST(LogFormat, LinesAndRecordsCutAnywhere) {
     });
   EXPECT_EQ(whole, (std::vector<std::string>{"1ab", "2c", "3"}));
   EXPECT_EQ(PartialLine(lines), "d");
-  const std::string_view record = R"({"user_id":"\u0041)";
-  for (std::size_t cut = record.size() - 4; cut < record.size(); ++cut)
-    EXPECT_EQ(ParseEventRecord(record.substr(0, cut)), std::nullopt) << cut;
 }
 
 } // namespace

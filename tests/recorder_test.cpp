@@ -1,7 +1,6 @@
 // The event log through the analytics exports: messages in order, results,
 // and the bytes of the log file, with faults injected into single calls.
 #include "OrvaneSDK.h"
-#include "analytics/record_cipher.h"
 #include "core/storage.h"
 #include "support/test_support.h"
 
@@ -26,7 +25,7 @@ namespace {
 class RecorderTest : public SandboxTest {
 protected:
   std::vector<std::string> Log() { // under the key of the first game id of this process
-    return Records(LogPath("g1"), KeyString(TakeKeyText(nullptr)));
+    return Records(LogPath("g1"), KeyTextFor("g1"));
   }
 };
 
@@ -36,11 +35,6 @@ std::string Rec(const std::string &type, const std::string &extra = "") {
 // A message of an analytics export: level 0 Info, 1 Warning, 2 Error.
 Message A(int level, const std::string &type, const std::string &text) {
   return {level, "[OrvaneSDK] Analytics " + type + " - " + text};
-}
-std::string Repeat(const std::string &text, int times) {
-  std::string out;
-  while (times-- > 0) out += text;
-  return out;
 }
 const Message kSdkNeverInitialized = A(0, "ENTER", "SDK was never initialized. Initializing the SDK.");
 const Message kNeverInitialized = A(1, "ENTER", "log was never initialized. Initialized the game log");
@@ -62,13 +56,10 @@ TEST_F(RecorderTest, ALogFromItsFirstEventOn) {
   oRegisterForLogs(RecordFromInside);
   Captured().clear();
   EXPECT_EQ(oAnalyticsGameEnter("g1", "u1"), 0);
-  EXPECT_EQ(Captured(), (std::vector<Message>{kSdkNeverInitialized,
-                                              {0, "[OrvaneSDK] Initialize() - OK."},
-                                              kNeverInitialized,
-                                              A(0, "EXIT", "OK"),
-                                              {0, "nested 0"},
-                                              A(0, "INIT", "OK"),
-                                              A(0, "ENTER", "OK")}));
+  EXPECT_EQ(Captured(),
+            (std::vector<Message>{kSdkNeverInitialized, Message{0, "[OrvaneSDK] Initialize() - OK."},
+                                  kNeverInitialized, A(0, "EXIT", "OK"), Message{0, "nested 0"},
+                                  A(0, "INIT", "OK"), A(0, "ENTER", "OK")}));
   EXPECT_EQ(Split(*ReadFile(LogPath("g1")), "\n").size(), 3u) << "line breaks only between lines";
   Captured().clear();
   EXPECT_EQ(oAnalyticsInit("g1", "u1"), 0);
@@ -91,12 +82,14 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
   std::filesystem::create_directories(where_.logs);
   // Which ids are refused is the game-id rule's test. An id is shown up to
   // its first 256 bytes, counted before escaping.
+  std::string escaped;
+  while (escaped.size() < 256 * 4) escaped += "\\x01";
   // clang-format off
   const std::pair<std::string, std::string> hostile[] = {
       {"../x", "../x"}, {"CON", "CON"}, {"t\tb\x7f", "t\\x09b\\x7f"},
       {"x\n[OrvaneSDK] y - OK\x1b[2K", "x\\x0a[OrvaneSDK] y - OK\\x1b[2K"},
       {std::string(256, 'a'), std::string(256, 'a')}, {std::string(257, 'a'), std::string(256, 'a') + "..."},
-      {std::string(1 << 20, '\x01'), Repeat("\\x01", 256) + "..."}};
+      {std::string(1 << 20, '\x01'), escaped + "..."}};
   // clang-format on
   for (const auto &[id, shown] : hostile) {
     Captured().clear();
@@ -108,7 +101,6 @@ TEST_F(RecorderTest, RefusedCallsTouchNothing) {
 }
 
 // Faults injected into single platform and cipher calls.
-const platform::Calls &Os() { return platform::native_calls(); }
 platform::Calls &Live() { return platform::calls(); }
 using cipher::Session;
 using platform::FileHandle;
@@ -118,22 +110,22 @@ std::string g_logs;
 std::int64_t g_now_ms;
 // Another process makes the logs directory while this open fails.
 FileHandle OpenRacingAnotherProcess(const char *path, LockResult &lock, std::int64_t &size) {
-  if (std::filesystem::exists(g_logs)) return Os().open_log(path, lock, size);
+  if (std::filesystem::exists(g_logs)) return os.open_log(path, lock, size);
   std::filesystem::create_directories(g_logs);
   return platform::kNoFile;
 }
 bool ShortAppend(FileHandle f, const void *d, std::size_t n) { // a full disk: a third goes in
-  Os().append(f, d, n / 3);
+  os.append(f, d, n / 3);
   return false;
 }
 // Another writer records while this one writes: into an empty log, or one
 // torn (g_tear), not yet cut back.
 bool g_tear;
 bool AnotherRecordsMeanwhile(FileHandle f, const void *d, std::size_t n) {
-  Live().append = Os().append;
-  if (g_tear) Os().append(f, d, n / 3);
+  Live().append = os.append;
+  if (g_tear) os.append(f, d, n / 3);
   oAnalyticsGameEnter("g1", "u1");
-  return !g_tear && Os().append(f, d, n);
+  return !g_tear && os.append(f, d, n);
 }
 void TearWhileAnotherRecords() { // the other writer's wait ends at the first reading of its deadline
   g_tear = true;
@@ -142,7 +134,7 @@ void TearWhileAnotherRecords() { // the other writer's wait ends at the first re
 }
 void NoLocks(bool (*append)(FileHandle, const void *, std::size_t)) {
   Live().open_log = [](const char *path, LockResult &lock, std::int64_t &size) {
-    const FileHandle f = Os().open_log(path, lock, size);
+    const FileHandle f = os.open_log(path, lock, size);
     lock = LockResult::kFailed;
     return f;
   };
@@ -159,12 +151,12 @@ LockResult BusyLock(FileHandle, LockMode) {
 }
 // Holds it at the first try, to start the log, then is gone.
 LockResult RivalStartsTheLog(FileHandle file, LockMode mode) {
-  if (g_lock_tries++ > 0) return Os().try_lock_file(file, mode);
+  if (g_lock_tries++ > 0) return os.try_lock_file(file, mode);
   std::int64_t size = 0;
   LockResult lock;
-  const FileHandle rival = Os().open_log((g_logs + "g1.log").c_str(), lock, size);
-  if (size == 0) Os().append(rival, "rival-init", 10);
-  Os().close_file(rival);
+  const FileHandle rival = os.open_log((g_logs + "g1.log").c_str(), lock, size);
+  if (size == 0) os.append(rival, "rival-init", 10);
+  os.close_file(rival);
   return LockResult::kBusy;
 }
 void InjectBusyLock(LockResult (*lock)(FileHandle, LockMode)) {
@@ -210,7 +202,7 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
       {"... and no other writer can have written behind it meanwhile", kNoLog, TearWhileAnotherRecords,
        -1, {busy, kNeverInitialized, init_write_failed, write_failed}},
       {"close fails", kStarted,
-       [] { Live().close_file = [](FileHandle f) { return Os().close_file(f) && false; }; }, -1,
+       [] { Live().close_file = [](FileHandle f) { return os.close_file(f) && false; }; }, -1,
        {write_failed}, {Rec("INIT"), Rec("ENTER")}},
       {"cipher fails", kStarted,
        [] { cipher::backend().encrypt = [](Session *, const std::uint8_t *, std::size_t, std::uint8_t *) {
@@ -265,8 +257,6 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
     EXPECT_EQ(Log().back(), Rec("EXIT"));
   }
 }
-
-void ORVANE_CALL Ignore(LogLevel, const char *) {}
 
 // An ordinary event takes an idle workspace, whose buffers an earlier event
 // sized, and allocates nothing. (The benchmark counts the cipher's own too.)

@@ -4,22 +4,17 @@
 #include <sys/wait.h>
 
 namespace orvane::testing {
-namespace {
-
-std::string Quoted(const std::string &text) {
-  std::string quoted(1, '\'');
-  for (const char c : text) c == '\'' ? quoted.append("'\\''") : quoted.append(1, c);
-  return quoted.append(1, '\'');
-}
-
-} // namespace
 
 // Through the shell: `timeout` ends a child that hangs, `env` adds its
 // variables, and bash's `exec -a` gives it the argument 0 a launcher would.
 ChildResult RunChild(const std::string &program, const std::vector<std::string> &args,
                      const std::vector<std::pair<std::string, std::string>> &env, int timeout_seconds) {
   std::string command = "timeout -s KILL " + std::to_string(timeout_seconds) + " env";
-  const auto add = [&command](const std::string &word) { command.append(1, ' ').append(Quoted(word)); };
+  const auto add = [&command](const std::string &word) { // quoted for the shell
+    command += " '";
+    for (const char c : word) c == '\'' ? command.append("'\\''") : command.append(1, c);
+    command += '\'';
+  };
   for (const auto &[name, value] : env) add(name + "=" + value);
   command += " bash -c 'exec -a \"$0\" \"$@\" 2>&1'";
   add(args.empty() ? program : args[0]);

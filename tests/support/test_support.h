@@ -33,9 +33,6 @@ std::vector<std::string> Split(std::string_view text, std::string_view separator
 // The lines of a log (platform line breaks), each decrypted with its time
 // stamp replaced by "T", or "(undecryptable)"; empty lines skipped.
 std::vector<std::string> Records(const std::string &log, const std::string &key_text);
-inline std::string KeyString(const KeyText &key_text) {
-  return std::string(key_text.begin(), key_text.end());
-}
 
 // Gives back the platform table and the cipher backend as they were, so
 // that no fake outlives its test, a failed ASSERT included.
@@ -47,6 +44,10 @@ struct CallsGuard {
     cipher::backend() = backend;
   }
 };
+
+// The platform's own calls, whatever fake the table holds.
+inline const platform::Calls &os = platform::native_calls();
+void ORVANE_CALL Ignore(LogLevel level, const char *message);
 
 // An empty data directory and a capturing callback for each test.
 class SandboxTest : public ::testing::Test {

@@ -4,7 +4,6 @@
 namespace orvane::testing {
 namespace {
 
-const platform::Calls &os = platform::native_calls();
 using WindowsTest = SandboxTest;
 
 // Every storage directory ends in a backslash, for which msvcrt's _stat
