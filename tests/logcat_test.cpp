@@ -198,7 +198,12 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
   Host({"init", "", "u4", "exit", "gA", "u4"}, 1); // the refused call makes it exit 1
   Host({"init", "gZ", "u5", "exit", "gA", "u5"});
   std::remove((logs_ + "gZ.log").c_str());
-  const std::string bad = "orvane-logcat: " + logs_ + "gA.log:5: " + std::string(FaultText(F::kBadPadding));
+  // Under a key that no candidate gives, the padding still reads right now and then, by chance.
+  const std::string fifth = Split(*ReadFile(logs_ + "gA.log"), "\n")[4];
+  F fault = F::kBadPadding;
+  for (const char *id : {"gA", "gB", ""})
+    if (DecryptLine(fifth, KeyTextFor(id))) fault = F::kNotRecord;
+  const std::string bad = "orvane-logcat: " + logs_ + "gA.log:5: " + std::string(FaultText(fault));
   EXPECT_EQ(Run({logs_}), Output(1, Printed("gA", {"gA", "gB", ""}) + b, bad + "\n"));
   // Followed: the logs, then each new line once, the newest before it ends; one keyed by a new log's game;
   // a missing log is waited for; one cut shorter is read again, one moved away and started again is read
