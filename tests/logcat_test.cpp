@@ -233,6 +233,9 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
 TEST_F(LogcatTool, UsageAndReadFailuresExitTwo) {
   std::filesystem::create_directory(dir_ + "/locked");
   std::filesystem::permissions(dir_ + "/locked", std::filesystem::perms::none);
+  std::filesystem::create_directory(dir_ + "/closed"); // apart: its log would give the others a key
+  WriteFile(dir_ + "/closed/g.log", "");
+  std::filesystem::permissions(dir_ + "/closed/g.log", std::filesystem::perms::none);
   user_ = geteuid() == 0 ? "setpriv --reuid=65534 --regid=65534 --clear-groups" : ""; // root may list any
   // clang-format off
   const std::pair<std::vector<std::string>, std::string> cases[] = {
@@ -246,6 +249,7 @@ TEST_F(LogcatTool, UsageAndReadFailuresExitTwo) {
       {{dir_ + "/x"}, "/x: cannot open: No such file or directory"}, // not taken for a log without a key
       {{"--check", dir_ + "/in/"}, "/in/: cannot open: Not a directory"},
       {{"--check", "--key-game-id=g", "/proc/self/mem", "/proc/self/cmdline"}, "read error: Input/output"},
+      {{dir_ + "/closed/g.log"}, "/g.log: cannot open: Permission denied"},
       {{"--check", dir_ + "/locked"}, "/locked: cannot list: Permission denied"}}; // no empty folder
   // clang-format on
   for (const auto &[args, message] : cases) {
