@@ -295,10 +295,10 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   // line).
   const bool starts_log = log.size == 0;
   const bool init_first = starts_log && !is_init;
+  const bool break_first = starts_log && !log.exclusive;
   std::string_view bytes = space.line;
-  if (starts_log && (init_first || !log.exclusive)) {
-    space.init_line.clear();
-    if (!log.exclusive) space.init_line = platform::line_break();
+  if (init_first || break_first) {
+    space.init_line = break_first ? platform::line_break() : std::string_view();
     if (init_first) {
       messages.Add(LogLevel::Warning, Message(type, Outcome::kLogNotInitialized));
       if (const Encoded encoded =

@@ -13,7 +13,7 @@ namespace orvane {
 // exhausted, say), the call reports `failure_message` at Error level and
 // returns `failure` instead: no exception ever reaches the host.
 template <class Result, class Work>
-Result RunUncancellable(Result failure, const char *failure_message, Work &&work) noexcept {
+Result RunCatching(Result failure, const char *failure_message, Work &&work) noexcept {
   MessageBatch messages;
   Result result = failure;
   try {
@@ -33,7 +33,7 @@ Result RunUncancellable(Result failure, const char *failure_message, Work &&work
 template <class Result, class Work>
 Result RunExport(Result failure, const char *failure_message, Work &&work) {
   const int cancellation = platform::DisableCancellation();
-  const Result result = RunUncancellable(failure, failure_message, std::forward<Work>(work));
+  const Result result = RunCatching(failure, failure_message, std::forward<Work>(work));
   platform::RestoreCancellation(cancellation);
   return result;
 }
