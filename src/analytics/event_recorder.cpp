@@ -128,7 +128,6 @@ struct LogFile {
   bool Close() {
     const platform::Calls &os = platform::calls();
     if (exclusive) os.unlock_file(handle);
-    exclusive = false;
     const bool closed = os.close_file(handle);
     handle = platform::kNoFile;
     return closed;
