@@ -77,11 +77,11 @@ TEST(LogFormat, HexBothWays) {
 TEST(LogFormat, LinesCutAnywhere) {
   LineSplitter lines;
   std::vector<std::string> whole;
-  for (const std::string_view read : {"a", "b\r", "\nc\n\n", "d\r"})
+  for (const std::string_view read : {"a", "b\r", "\nc", "e\n\n", "d\r"})
     FeedBytes(lines, read, [&](std::uint64_t n, std::string_view text) {
       whole.push_back(std::to_string(n).append(text));
     });
-  EXPECT_EQ(whole, (std::vector<std::string>{"1ab", "2c", "3"}));
+  EXPECT_EQ(whole, (std::vector<std::string>{"1ab", "2ce", "3"}));
   EXPECT_EQ(PartialLine(lines), "d");
 }
 
