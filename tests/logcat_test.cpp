@@ -79,29 +79,42 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   KeyPool pool;
   LineBuffers buf;
   EventRecord r;
+  const auto keys = [](std::vector<std::string> ids) {
+    KeyCandidates made;
+    for (const std::string &id : ids) AddCandidate(made, id);
+    return made;
+  };
+  using Ids = std::vector<std::string>;
   // clang-format off
-  const struct { std::string line; KeyCandidates keys; F fault; std::size_t winner, decryptions; } cases[] = {
-      {good, {first}, F::kNone, 0, 1}, {good, {last}, F::kNone, 2, 3}, {good, {last, 2}, F::kNone, 2, 1},
-      {good, {first, 2}, F::kNone, 0, 2}, {good, {{"g2", "g3"}, 1}, F::kBadPadding, 1, 2},
-      {good.substr(0, 32), {first, 1}, F::kBadPadding, 1, 3}, // its first block alone
-      {not_record, {last, 1}, F::kNotRecord, 1, 3}, {"", {first}, F::kNotBlocks, 0, 0},
-      {good.substr(8), {first}, F::kNotBlocks, 0, 0}, {"x", {first}, F::kNotHex, 0, 0},
-      {good.substr(0, 10) + "g" + good.substr(11), {first}, F::kNotHex, 0, 0},
-      {good, {}, F::kBadPadding, 0, 0}}; // no candidate
+  const struct { std::string line; Ids ids; std::size_t before; F fault; std::size_t winner, decryptions; } cases[] = {
+      {good, first, 0, F::kNone, 0, 1}, {good, last, 0, F::kNone, 2, 3}, {good, last, 2, F::kNone, 2, 1},
+      {good, first, 2, F::kNone, 0, 2}, {good, {"g2", "g3"}, 1, F::kBadPadding, 1, 2},
+      {good.substr(0, 32), first, 1, F::kBadPadding, 1, 3}, // its first block alone
+      {not_record, last, 1, F::kNotRecord, 1, 3}, {"", first, 0, F::kNotBlocks, 0, 0},
+      {good.substr(8), first, 0, F::kNotBlocks, 0, 0}, {"x", first, 0, F::kNotHex, 0, 0},
+      {good.substr(0, 10) + "g" + good.substr(11), first, 0, F::kNotHex, 0, 0},
+      {good, {}, 0, F::kBadPadding, 0, 0}}; // no candidate
   for (auto c : cases) // braces: ReadLine runs before the winner and the count are read
-    EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
+    EXPECT_EQ((std::tuple{ReadLine(pool, keys(c.ids), c.before, c.line, buf, r), c.before, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
   // clang-format on
+  // Past its bound the pool starts empty again: a folder of many games keeps its memory.
+  std::size_t winner = 0, most = 0;
+  for (std::size_t k = 0; k <= kPooledKeys; ++k) {
+    ReadLine(pool, keys({std::to_string(k)}), winner, good, buf, r);
+    most = std::max(most, pool.keys.size());
+  }
+  EXPECT_EQ(most, kPooledKeys);
   cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * {
     return nullptr;
   };
-  KeyCandidates unusable{{"g4"}};
-  EXPECT_EQ(ReadLine(pool, unusable, good, buf, r), F::kBadPadding);
+  EXPECT_EQ(ReadLine(pool, keys({"g4"}), winner, good, buf, r), F::kBadPadding);
   EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
   const std::string part(kKeyGameIdBytes, 'k'); // ids alike in the bytes that make the key: one candidate
   KeyCandidates alike;
   for (const std::string &id : {part + "a", part + "b", part.substr(1) + "x", part}) AddCandidate(alike, id);
   EXPECT_EQ(alike.game_ids, (std::vector<std::string>{part + "a", part.substr(1) + "x"}));
+  EXPECT_EQ(FindCandidate(alike, part + "z"), 0U);
 }
 
 // Real days and times only, and a window that some time can pass.
