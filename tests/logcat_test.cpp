@@ -79,9 +79,10 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   KeyPool pool;
   LineBuffers buf;
   EventRecord r;
-  const auto keys = [](std::vector<std::string> ids) {
+  const auto keys = [](std::vector<std::string> ids, std::size_t folder_winner = 0) {
     KeyCandidates made;
     for (const std::string &id : ids) AddCandidate(made, id);
+    made.last_winner = folder_winner;
     return made;
   };
   using Ids = std::vector<std::string>;
@@ -94,21 +95,31 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
       {good.substr(8), first, 0, F::kNotBlocks, 0, 0}, {"x", first, 0, F::kNotHex, 0, 0},
       {good.substr(0, 10) + "g" + good.substr(11), first, 0, F::kNotHex, 0, 0},
       {good, {}, 0, F::kBadPadding, 0, 0}}; // no candidate
-  for (auto c : cases) // braces: ReadLine runs before the winner and the count are read
-    EXPECT_EQ((std::tuple{ReadLine(pool, keys(c.ids), c.before, c.line, buf, r), c.before, std::exchange(g_count, 0)}),
+  for (auto c : cases) { // the folder's winner is the file's: tried once
+    KeyCandidates k = keys(c.ids, c.before);
+    EXPECT_EQ((std::tuple{ReadLine(pool, k, c.before, c.line, buf, r), c.before, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
+  }
+  // Then the folder's winner, right after the file's own.
+  KeyCandidates folder = keys({"g2", "g3", "g4", "g1"}, 3), other = keys({"g2", "g3"}, 1);
+  std::size_t winner = 0, most = 0;
+  EXPECT_EQ((std::tuple{ReadLine(pool, folder, winner, good, buf, r), winner, std::exchange(g_count, 0)}),
+            std::tuple(F::kNone, 3U, 2U));
+  EXPECT_EQ((std::tuple{ReadLine(pool, other, winner = 0, good, buf, r), other.last_winner, g_count}),
+            std::tuple(F::kBadPadding, 1U, 2U)) << "kept when no key reads the line";
   // clang-format on
   // Past its bound the pool starts empty again: a folder of many games keeps its memory.
-  std::size_t winner = 0, most = 0;
   for (std::size_t k = 0; k <= kPooledKeys; ++k) {
-    ReadLine(pool, keys({std::to_string(k)}), winner, good, buf, r);
+    KeyCandidates one = keys({std::to_string(k)});
+    ReadLine(pool, one, winner, good, buf, r);
     most = std::max(most, pool.keys.size());
   }
   EXPECT_EQ(most, kPooledKeys);
   cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * {
     return nullptr;
   };
-  EXPECT_EQ(ReadLine(pool, keys({"g4"}), winner, good, buf, r), F::kBadPadding);
+  KeyCandidates unusable = keys({"g4"});
+  EXPECT_EQ(ReadLine(pool, unusable, winner, good, buf, r), F::kBadPadding);
   EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
   const std::string part(kKeyGameIdBytes, 'k'); // ids alike in the bytes that make the key: one candidate
   KeyCandidates alike;

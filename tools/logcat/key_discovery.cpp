@@ -40,20 +40,23 @@ std::size_t FindCandidate(const KeyCandidates &candidates, std::string_view game
   return found == candidates.by_key.end() ? candidates.game_ids.size() : found->second;
 }
 
-LineFault ReadLine(KeyPool &pool, const KeyCandidates &candidates, std::size_t &winner, std::string_view line,
+LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::size_t &winner, std::string_view line,
                    LineBuffers &buffers, EventRecord &record) {
   if (const LineFault fault = TakeCiphertext(line, buffers); fault != LineFault::kNone) return fault;
   LineFault worst = LineFault::kBadPadding;
   const std::size_t count = candidates.game_ids.size();
-  for (std::size_t k = 0; k <= count; ++k) {
-    // k = 0 is the last winner; then every candidate in order but that one.
-    const std::size_t index = k == 0 ? winner : k - 1;
-    if (index >= count || (k != 0 && index == winner)) continue;
+  const std::size_t folders = candidates.last_winner;
+  for (std::size_t k = 0; k <= count + 1; ++k) {
+    // The file's last winner, the folder's, then every candidate in order but those.
+    const std::size_t index = k == 0 ? winner : k == 1 ? folders : k - 2;
+    if (index >= count || (k == 1 && index == winner) || (k > 1 && (index == winner || index == folders)))
+      continue;
     const LogKey *key = PooledKey(pool, candidates.game_ids[index]);
     if (key == nullptr) continue;
     const LineFault fault = DecryptRecord(*key, buffers, record);
     if (fault == LineFault::kNone) {
       winner = index;
+      candidates.last_winner = index;
       return fault;
     }
     if (fault == LineFault::kNotRecord) worst = fault;

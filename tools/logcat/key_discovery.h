@@ -37,6 +37,10 @@ struct KeyCandidates {
   // Index in game_ids by the bytes that make the key: a folder of many logs
   // adds and finds its candidates by lookup, not by a scan.
   std::unordered_map<std::string, std::size_t> by_key;
+  // The candidate that read the folder's last line read. One process writes
+  // the logs of every game it records under one key, so that key is tried
+  // right after the file's own: a folder of such logs costs no scan a log.
+  std::size_t last_winner = 0;
 };
 
 // Adds `game_id` unless a candidate with the same key is there already;
@@ -47,11 +51,12 @@ std::size_t FindCandidate(const KeyCandidates &candidates, std::string_view game
 
 // Reads one line with the first candidate whose key decrypts it with valid
 // padding and gives a record; `winner` then names that candidate. Since runs
-// of lines share a key, the last winner (at first the file's own game id) is
-// tried first and a line costs one decryption except where a run begins.
+// of lines share a key, the file's last winner (at first the file's own game
+// id) is tried first, then the folder's, and a line costs one decryption
+// except where a run begins.
 // kBadPadding when no key decrypts it, kNotRecord when one does but the text
 // is no record.
-LineFault ReadLine(KeyPool &pool, const KeyCandidates &candidates, std::size_t &winner, std::string_view line,
+LineFault ReadLine(KeyPool &pool, KeyCandidates &candidates, std::size_t &winner, std::string_view line,
                    LineBuffers &buffers, EventRecord &record);
 
 } // namespace orvane::logcat

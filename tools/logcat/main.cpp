@@ -207,7 +207,7 @@ bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_
               bool report) {
   // Empty lines carry nothing: a writer may put a line break before a log's first line.
   if (line.empty()) return false;
-  const KeyCandidates &keys = source.keys->keys;
+  KeyCandidates &keys = source.keys->keys;
   LineFault fault = ReadLine(reader.pool, keys, source.winner, line, reader.buffers, reader.record);
   if ((fault == LineFault::kBadPadding || fault == LineFault::kNotRecord) && ListFolderKeys(reader, *source.keys))
     fault = ReadLine(reader.pool, keys, source.winner, line, reader.buffers, reader.record);
