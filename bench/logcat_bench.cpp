@@ -70,7 +70,8 @@ cipher::Session *SessionFor(const std::string &key_game_id) {
 }
 
 void WriteLog(const fs::path &path, Writer &writer, const std::string &game, int records) {
-  const std::string key_game = game != "g0" && std::hash<std::string>{}(game) % kForeignEvery == 0 ? "g0" : game;
+  const std::string key_game =
+      game != "g0" && std::hash<std::string>{}(game) % kForeignEvery == 0 ? "g0" : game;
   cipher::Session *session = SessionFor(key_game);
   std::string out;
   for (int n = 0; n < records; ++n) AppendLine(writer, session, game, n == 0 ? "INIT" : "SPECIAL", n, out);

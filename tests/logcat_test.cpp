@@ -135,9 +135,11 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   EXPECT_EQ(FindCandidate(alike, part + "z"), 0U);
 }
 
-// A line past the limit is reported once, where it starts, and dropped to its end unheld, however reads cut it.
+// A line past the limit is reported once, where it starts, and dropped to its end unheld, however reads cut
+// it.
 TEST(LineReader, ALineTooLongIsReportedAtItsStartAndNeverHeld) {
-  const std::string bytes = "ab\nabcdefgh\nabcde\r\nabcdef\r\n\nabc"; // the limit 6 holds "abcde\r", not "abcdef\r"
+  const std::string bytes =
+      "ab\nabcdefgh\nabcde\r\nabcdef\r\n\nabc"; // the limit 6 holds "abcde\r", not "abcdef\r"
   for (const std::size_t cut : {1, 2, 5, 100}) {
     LineReader reader{{}, 6};
     std::string seen;
@@ -145,7 +147,9 @@ TEST(LineReader, ALineTooLongIsReportedAtItsStartAndNeverHeld) {
     for (std::size_t at = 0; at < bytes.size(); at += cut) {
       FeedLines(
           reader, std::string_view(bytes).substr(at, cut),
-          [&](std::uint64_t n, std::string_view line) { seen += std::to_string(n) + ":" + std::string(line) + " "; },
+          [&](std::uint64_t n, std::string_view line) {
+            seen += std::to_string(n) + ":" + std::string(line) + " ";
+          },
           [&](std::uint64_t n) { seen += std::to_string(n) + ":long "; });
       most = std::max(most, reader.lines.partial.size());
     }
@@ -286,8 +290,8 @@ constexpr bool kSanitized = false;
 #endif
 
 // Only regular files are read: anything else is reported with what it is, a link that leads nowhere with the
-// system's reason, and the run goes on to exit 2. A line longer than any the library writes (a zero-filled tail)
-// is skipped unheld; a line that memory cannot hold costs only the rest of its file.
+// system's reason, and the run goes on to exit 2. A line longer than any the library writes (a zero-filled
+// tail) is skipped unheld; a line that memory cannot hold costs only the rest of its file.
 TEST_F(LogcatTool, OnlyRegularFilesAreReadAndTheRunGoesOn) {
   Host({"init", "g1", "u1"});
   const std::string g1 = Printed("g1", {"g1"}), said = "orvane-logcat: " + logs_;
@@ -316,7 +320,8 @@ TEST_F(LogcatTool, OnlyRegularFilesAreReadAndTheRunGoesOn) {
   Host({"init", "g1", "u1"});
   WriteFile(logs_ + "a.log", std::string(48 << 20, 'a')); // hex of whole blocks, held with its bytes
   user_ = "prlimit --as=90000000 --";
-  EXPECT_EQ(Run({logs_}), Output(2, Printed("g1", {"g1"}), said + "a.log: out of memory; the rest of this file is not read\n"));
+  EXPECT_EQ(Run({logs_}), Output(2, Printed("g1", {"g1"}),
+                                 said + "a.log: out of memory; the rest of this file is not read\n"));
 }
 
 // Each log is read once however its path is spelled or reached, and a log is open only while it is read (when
@@ -356,8 +361,9 @@ TEST_F(LogcatTool, CheckWaitsForTheLastLineAWriterIsAppending) {
   check.join();
   EXPECT_EQ(checked, Output(0, summary, ""));
   WriteFile(path, torn);
-  EXPECT_EQ(Run({"--check", logs_}), Output(1, logs_ + "g1.log: 1 records, 1 bad lines, 0 records with bytes not UTF-8\n",
-                                            "orvane-logcat: " + path + ":2: not whole 16-byte blocks of hex\n"));
+  EXPECT_EQ(Run({"--check", logs_}),
+            Output(1, logs_ + "g1.log: 1 records, 1 bad lines, 0 records with bytes not UTF-8\n",
+                   "orvane-logcat: " + path + ":2: not whole 16-byte blocks of hex\n"));
 }
 
 // A usage error, or a file or folder that could not be read (even after a bad line), exits 2 and says why.

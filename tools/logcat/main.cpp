@@ -83,8 +83,8 @@ struct Reader {
   KeyPool pool;
   std::deque<Source> sources; // a deque, since following a folder adds to it
   std::vector<Folder> folders;
-  std::map<std::string, FolderKeys> folder_keys; // by the folder's path in normal form
-  std::set<std::string> known_paths;             // in normal form
+  std::map<std::string, FolderKeys> folder_keys;                 // by the folder's path in normal form
+  std::set<std::string> known_paths;                             // in normal form
   std::set<std::pair<std::uint64_t, std::uint64_t>> known_files; // identities: each read once
   std::size_t open_files = 0;
   std::uint64_t pass = 1; // one pass over every source; a folder is listed once a pass
@@ -152,7 +152,8 @@ bool AddSource(Reader &reader, const fs::path &path) {
   const bool is_stdin = path == "-";
   if (!is_stdin && !FirstSighting(reader, path)) return true;
   const std::optional<std::string> own = is_stdin ? std::nullopt : GameIdOfLogName(path);
-  FolderKeys &keys = is_stdin ? KeysOf(reader, {}) : KeysOf(reader, path.has_parent_path() ? path.parent_path() : ".");
+  FolderKeys &keys =
+      is_stdin ? KeysOf(reader, {}) : KeysOf(reader, path.has_parent_path() ? path.parent_path() : ".");
   if (own) AddCandidate(keys.keys, *own);
   if (!own && !keys.named) {
     Complain(is_stdin ? "standard input has no file name to take the game id from; give --key-game-id"
@@ -209,7 +210,8 @@ bool TakeLine(Reader &reader, Source &source, std::uint64_t number, std::string_
   if (line.empty()) return false;
   KeyCandidates &keys = source.keys->keys;
   LineFault fault = ReadLine(reader.pool, keys, source.winner, line, reader.buffers, reader.record);
-  if ((fault == LineFault::kBadPadding || fault == LineFault::kNotRecord) && ListFolderKeys(reader, *source.keys))
+  if ((fault == LineFault::kBadPadding || fault == LineFault::kNotRecord) &&
+      ListFolderKeys(reader, *source.keys))
     fault = ReadLine(reader.pool, keys, source.winner, line, reader.buffers, reader.record);
   if (fault != LineFault::kNone && !report) return false;
   const bool first = !source.any_line;
@@ -343,8 +345,10 @@ bool ReadToEnd(Reader &reader, Source &source, std::string &out) {
     FeedLines(source.lines, std::string_view(buffer, n), take, too_long);
     Emit(out);
   }
-  if (std::ferror(source.file)) GiveUp(reader, source, std::string("read error: ") + std::strerror(errno));
-  else std::clearerr(source.file);
+  if (std::ferror(source.file))
+    GiveUp(reader, source, std::string("read error: ") + std::strerror(errno));
+  else
+    std::clearerr(source.file);
   return any;
 }
 
@@ -396,8 +400,10 @@ bool ReadAvailable(Reader &reader, Source &source) {
   bool any = false;
   try {
     any = ReadToEnd(reader, source, out);
-    if (!follow || replaced) TakeLastLine(reader, source, out);
-    else if (!source.unreadable) TakePartialLine(reader, source, out);
+    if (!follow || replaced)
+      TakeLastLine(reader, source, out);
+    else if (!source.unreadable)
+      TakePartialLine(reader, source, out);
   } catch (const std::bad_alloc &) {
     out.clear();
     GiveUp(reader, source, "out of memory; the rest of this file is not read");

@@ -10,8 +10,8 @@
 namespace orvane::logcat {
 
 struct OpenedFile {
-  std::FILE *file = nullptr; // a binary stream, or null
-  int error = 0;             // errno's reason when it could not be opened
+  std::FILE *file = nullptr;  // a binary stream, or null
+  int error = 0;              // errno's reason when it could not be opened
   const char *kind = nullptr; // what the path names instead of a regular file ("a FIFO")
 };
 
