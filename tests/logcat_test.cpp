@@ -3,14 +3,21 @@
 #include "analytics/record_cipher.h"
 #include "help_text.h"
 #include "key_discovery.h"
+#include "line_reader.h"
 #include "logformat/hex.h"
 #include "record_filter.h"
 #include "support/test_support.h"
 #include "valid_utf8.h"
 
 #include <filesystem>
+#include <fstream>
 #include <thread>
 
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/un.h>
 #include <unistd.h>
 
 namespace orvane::logcat {
@@ -79,29 +86,76 @@ TEST(LogLine, ReadWithTheFirstCandidateThatGivesARecord) {
   KeyPool pool;
   LineBuffers buf;
   EventRecord r;
+  const auto keys = [](std::vector<std::string> ids, std::size_t folder_winner = 0) {
+    KeyCandidates made;
+    for (const std::string &id : ids) AddCandidate(made, id);
+    made.last_winner = folder_winner;
+    return made;
+  };
+  using Ids = std::vector<std::string>;
   // clang-format off
-  const struct { std::string line; KeyCandidates keys; F fault; std::size_t winner, decryptions; } cases[] = {
-      {good, {first}, F::kNone, 0, 1}, {good, {last}, F::kNone, 2, 3}, {good, {last, 2}, F::kNone, 2, 1},
-      {good, {first, 2}, F::kNone, 0, 2}, {good, {{"g2", "g3"}, 1}, F::kBadPadding, 1, 2},
-      {good.substr(0, 32), {first, 1}, F::kBadPadding, 1, 3}, // its first block alone
-      {not_record, {last, 1}, F::kNotRecord, 1, 3}, {"", {first}, F::kNotBlocks, 0, 0},
-      {good.substr(8), {first}, F::kNotBlocks, 0, 0}, {"x", {first}, F::kNotHex, 0, 0},
-      {good.substr(0, 10) + "g" + good.substr(11), {first}, F::kNotHex, 0, 0},
-      {good, {}, F::kBadPadding, 0, 0}}; // no candidate
-  for (auto c : cases) // braces: ReadLine runs before the winner and the count are read
-    EXPECT_EQ((std::tuple{ReadLine(pool, c.keys, c.line, buf, r), c.keys.winner, std::exchange(g_count, 0)}),
+  const struct { std::string line; Ids ids; std::size_t before; F fault; std::size_t winner, decryptions; } cases[] = {
+      {good, first, 0, F::kNone, 0, 1}, {good, last, 0, F::kNone, 2, 3}, {good, last, 2, F::kNone, 2, 1},
+      {good, first, 2, F::kNone, 0, 2}, {good, {"g2", "g3"}, 1, F::kBadPadding, 1, 2},
+      {good.substr(0, 32), first, 1, F::kBadPadding, 1, 3}, // its first block alone
+      {not_record, last, 1, F::kNotRecord, 1, 3}, {"", first, 0, F::kNotBlocks, 0, 0},
+      {good.substr(8), first, 0, F::kNotBlocks, 0, 0}, {"x", first, 0, F::kNotHex, 0, 0},
+      {good.substr(0, 10) + "g" + good.substr(11), first, 0, F::kNotHex, 0, 0},
+      {good, {}, 0, F::kBadPadding, 0, 0}}; // no candidate
+  for (auto c : cases) { // the folder's winner is the file's: tried once
+    KeyCandidates k = keys(c.ids, c.before);
+    EXPECT_EQ((std::tuple{ReadLine(pool, k, c.before, c.line, buf, r), c.before, std::exchange(g_count, 0)}),
               std::tuple(c.fault, c.winner, c.decryptions)) << c.line;
+  }
+  // Then the folder's winner, right after the file's own.
+  KeyCandidates folder = keys({"g2", "g3", "g4", "g1"}, 3), other = keys({"g2", "g3"}, 1);
+  std::size_t winner = 0, most = 0;
+  EXPECT_EQ((std::tuple{ReadLine(pool, folder, winner, good, buf, r), winner, std::exchange(g_count, 0)}),
+            std::tuple(F::kNone, 3U, 2U));
+  EXPECT_EQ((std::tuple{ReadLine(pool, other, winner = 0, good, buf, r), other.last_winner, g_count}),
+            std::tuple(F::kBadPadding, 1U, 2U)) << "kept when no key reads the line";
   // clang-format on
+  // Past its bound the pool starts empty again: a folder of many games keeps its memory.
+  for (std::size_t k = 0; k <= kPooledKeys; ++k) {
+    KeyCandidates one = keys({std::to_string(k)});
+    ReadLine(pool, one, winner, good, buf, r);
+    most = std::max(most, pool.keys.size());
+  }
+  EXPECT_EQ(most, kPooledKeys);
   cipher::backend().open = [](const std::uint8_t *, const std::uint8_t *) -> cipher::Session * {
     return nullptr;
   };
-  KeyCandidates unusable{{"g4"}};
-  EXPECT_EQ(ReadLine(pool, unusable, good, buf, r), F::kBadPadding);
+  KeyCandidates unusable = keys({"g4"});
+  EXPECT_EQ(ReadLine(pool, unusable, winner, good, buf, r), F::kBadPadding);
   EXPECT_TRUE(pool.failed) << "a key whose session cannot be made is reported";
   const std::string part(kKeyGameIdBytes, 'k'); // ids alike in the bytes that make the key: one candidate
   KeyCandidates alike;
   for (const std::string &id : {part + "a", part + "b", part.substr(1) + "x", part}) AddCandidate(alike, id);
   EXPECT_EQ(alike.game_ids, (std::vector<std::string>{part + "a", part.substr(1) + "x"}));
+  EXPECT_EQ(FindCandidate(alike, part + "z"), 0U);
+}
+
+// A line past the limit is reported once, where it starts, and dropped to its end unheld, however reads cut
+// it.
+TEST(LineReader, ALineTooLongIsReportedAtItsStartAndNeverHeld) {
+  const std::string bytes =
+      "ab\nabcdefgh\nabcde\r\nabcdef\r\n\nabc"; // the limit 6 holds "abcde\r", not "abcdef\r"
+  for (const std::size_t cut : {1, 2, 5, 100}) {
+    LineReader reader{{}, 6};
+    std::string seen;
+    std::size_t most = 0;
+    for (std::size_t at = 0; at < bytes.size(); at += cut) {
+      FeedLines(
+          reader, std::string_view(bytes).substr(at, cut),
+          [&](std::uint64_t n, std::string_view line) {
+            seen += std::to_string(n) + ":" + std::string(line) + " ";
+          },
+          [&](std::uint64_t n) { seen += std::to_string(n) + ":long "; });
+      most = std::max(most, reader.lines.partial.size());
+    }
+    EXPECT_EQ(seen + std::string(PartialLine(reader.lines)), "1:ab 2:long 3:abcde 4:long 5: abc") << cut;
+    EXPECT_LE(most, 6U) << cut;
+  }
 }
 
 // Real days and times only, and a window that some time can pass.
@@ -227,6 +281,89 @@ TEST_F(LogcatTool, ReadsEveryLineOfAFolderThatProcessesWroteInAnyOrder) {
                               "gB.log: became shorter; reading it again from the start\n" + said +
                               "gA.log: was replaced; reading the new file from its start\n";
   EXPECT_EQ(followed, Output(-1, lb[3] + "\n" + s + t + lb[3] + "\n" + v, notices));
+}
+
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr bool kSanitized = true; // its shadow memory takes more address space than any limit here allows
+#else
+constexpr bool kSanitized = false;
+#endif
+
+// Only regular files are read: anything else is reported with what it is, a link that leads nowhere with the
+// system's reason, and the run goes on to exit 2. A line longer than any the library writes (a zero-filled
+// tail) is skipped unheld; a line that memory cannot hold costs only the rest of its file.
+TEST_F(LogcatTool, OnlyRegularFilesAreReadAndTheRunGoesOn) {
+  Host({"init", "g1", "u1"});
+  const std::string g1 = Printed("g1", {"g1"}), said = "orvane-logcat: " + logs_;
+  mkfifo((logs_ + "fifo.log").c_str(), 0600);
+  symlink("loop.log", (logs_ + "loop.log").c_str());
+  symlink("gone", (logs_ + "dead.log").c_str());
+  sockaddr_un address{AF_UNIX, {}};
+  (logs_ + "sock.log").copy(address.sun_path, sizeof address.sun_path - 1);
+  const int sock = socket(AF_UNIX, SOCK_STREAM, 0);
+  ASSERT_EQ(bind(sock, reinterpret_cast<sockaddr *>(&address), sizeof address), 0);
+  WriteFile(logs_ + "long.log", "");
+  std::filesystem::resize_file(logs_ + "long.log", std::size_t{1} << 30); // sparse: no disk taken
+  std::ofstream(logs_ + "long.log", std::ios::app) << "\n" << *ReadFile(logs_ + "g1.log");
+  user_ = kSanitized ? "" : "prlimit --as=400000000 --";
+  EXPECT_EQ(Run({logs_, "--key-game-id=g1", "/dev/null"}),
+            Output(2, g1 + g1,
+                   said + "dead.log: cannot open: No such file or directory\n" + said +
+                       "fifo.log: is a FIFO, not a regular file; not read\n" + said +
+                       "long.log:1: longer than any line the library writes; skipped to its end\n" + said +
+                       "loop.log: cannot open: Too many levels of symbolic links\n" + said +
+                       "sock.log: is a socket, not a regular file; not read\n"
+                       "orvane-logcat: /dev/null: is a character device, not a regular file; not read\n"));
+  close(sock);
+  if (kSanitized) return;
+  RemoveTree(logs_);
+  Host({"init", "g1", "u1"});
+  WriteFile(logs_ + "a.log", std::string(48 << 20, 'a')); // hex of whole blocks, held with its bytes
+  user_ = "prlimit --as=90000000 --";
+  EXPECT_EQ(Run({logs_}), Output(2, Printed("g1", {"g1"}),
+                                 said + "a.log: out of memory; the rest of this file is not read\n"));
+}
+
+// Each log is read once however its path is spelled or reached, and a log is open only while it is read (when
+// followed, but for a bound), so a folder of many logs reads under a small descriptor limit.
+TEST_F(LogcatTool, EachLogIsReadOnceAndFewAreOpen) {
+  Host({"init", "g1", "u1"});
+  std::string all = Printed("g1", {"g1"});
+  const std::string once = all, log = *ReadFile(logs_ + "g1.log");
+  for (int k = 0; k < 300; ++k, all += once) WriteFile(logs_ + "c" + std::to_string(k) + ".log", log);
+  std::filesystem::create_symlink("g1.log", logs_ + "link.log");
+  std::filesystem::create_hard_link(logs_ + "g1.log", logs_ + "hard.log");
+  user_ = "prlimit --nofile=100 --";
+  const std::string spelled = dir_ + "/Orvane/./Logs/g1.log";
+  EXPECT_EQ(Run({logs_, spelled, logs_ + "../Logs/", dir_ + "/Orvane/Logs"}), Output(0, all, ""));
+  Output followed; // the last log, closed since, is found again by its path
+  std::thread tail([&] { followed = Run({"--follow", logs_}, "", 6); });
+  std::this_thread::sleep_for(std::chrono::milliseconds(2000));
+  std::ofstream(logs_ + "c299.log", std::ios::app) << "\n" << log;
+  tail.join();
+  EXPECT_EQ(followed, Output(-1, all + once, ""));
+}
+
+// An unended last line that no key reads is still being written while a writer of the library holds the log's
+// lock (every append holds it): it is waited for. With no writer at work it is torn, and reported.
+TEST_F(LogcatTool, CheckWaitsForTheLastLineAWriterIsAppending) {
+  Host({"init", "g1", "u1", "enter", "g1", "u1"});
+  const std::string path = logs_ + "g1.log", log = *ReadFile(path), torn = log.substr(0, log.size() - 20);
+  const std::string summary = logs_ + "g1.log: 2 records, 0 bad lines, 0 records with bytes not UTF-8\n";
+  WriteFile(path, torn);
+  const int writer = open(path.c_str(), O_WRONLY | O_APPEND);
+  ASSERT_EQ(flock(writer, LOCK_SH), 0);
+  Output checked;
+  std::thread check([&] { checked = Run({"--check", logs_}); });
+  std::this_thread::sleep_for(std::chrono::milliseconds(300)); // either way, the line is read whole
+  ASSERT_EQ(write(writer, log.data() + torn.size(), 20), 20);
+  close(writer);
+  check.join();
+  EXPECT_EQ(checked, Output(0, summary, ""));
+  WriteFile(path, torn);
+  EXPECT_EQ(Run({"--check", logs_}),
+            Output(1, logs_ + "g1.log: 1 records, 1 bad lines, 0 records with bytes not UTF-8\n",
+                   "orvane-logcat: " + path + ":2: not whole 16-byte blocks of hex\n"));
 }
 
 // A usage error, or a file or folder that could not be read (even after a bad line), exits 2 and says why.

@@ -82,7 +82,9 @@ OPTIONS
         lines, K records with bytes not UTF-8" instead. Filters narrow the
         records counted. A log whose first record is not INIT has lost its
         start: that line is reported as "FILE:LINE: first record is not
-        INIT" and counted as bad.
+        INIT" and counted as bad. A last line without a line break that no
+        key reads while a writer holds the log's lock is being appended: it
+        is waited for, not reported; with no writer at work it is torn.
         Example: orvane-logcat --check Logs/
 
     --follow
@@ -118,13 +120,20 @@ DIAGNOSTICS
     exist (unless --follow waits for it), cannot be opened, listed or read
     is reported with the system's reason ("FILE: cannot open: No such file or directory", "FOLDER: cannot
     list: Permission denied", "FILE: read error: ..."), and reading goes on
-    with the next.
+    with the next. Only regular files are read: anything else is reported
+    as "FILE: is a FIFO, not a regular file; not read" (a character or
+    block device, a socket, a folder). A line longer than any the library
+    writes (64 MiB) is reported where it starts and skipped to its end; a
+    file whose line memory cannot hold is reported ("FILE: out of memory;
+    the rest of this file is not read"). A file reached by two paths is
+    read once.
 
 EXIT STATUS
     0   every line was a good record
     1   some lines were bad (with --check, also a first record not INIT)
     2   a usage error, or a file or folder that could not be found, opened,
-        listed or read, in every mode, --check included; it outranks 1
+        listed or read, or is not a regular file, in every mode, --check
+        included; it outranks 1
 )";
 
 } // namespace orvane::logcat

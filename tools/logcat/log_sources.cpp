@@ -20,8 +20,10 @@ std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folde
   std::vector<std::filesystem::path> files;
   for (std::filesystem::directory_iterator entry(folder, error), end; !error && entry != end;
        entry.increment(error)) {
+    // Whatever is not a folder: a FIFO, a device or a link that leads nowhere
+    // is reported when it is read, never skipped in silence.
     std::error_code type_error;
-    if (entry->is_regular_file(type_error) && GameIdOfLogName(entry->path())) files.push_back(entry->path());
+    if (GameIdOfLogName(entry->path()) && !entry->is_directory(type_error)) files.push_back(entry->path());
   }
   std::sort(files.begin(), files.end());
   return files;

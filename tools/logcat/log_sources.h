@@ -15,8 +15,8 @@ namespace orvane::logcat {
 // nullopt for a name that does not end in ".log".
 std::optional<std::string> GameIdOfLogName(const std::filesystem::path &file);
 
-// The *.log files directly inside `folder`, sorted by name; `error` tells
-// why when it cannot be listed (or not to its end).
+// The *.log entries directly inside `folder` that are not folders, sorted by
+// name; `error` tells why when it cannot be listed (or not to its end).
 std::vector<std::filesystem::path> LogFilesIn(const std::filesystem::path &folder, std::error_code &error);
 
 // The game ids of the *.log files directly inside `folder`; none when it
