@@ -85,7 +85,7 @@ pdb_matches() { # BINARY FUNCTION SOURCE
   local guid="${b[3]}${b[2]}${b[1]}${b[0]}-${b[5]}${b[4]}-${b[7]}${b[6]}-${b[8]}${b[9]}-$(printf %s "${b[@]:10}")"
   [[ $directory == *"PDBAge: 1"*"PDBFileName: ${pdb##*/}"* ]] &&
     [[ $(llvm-pdbutil dump -summary "$pdb") == *"Age: 1"*"GUID: {$guid}"* ]] || return 1
-  llvm-pdbutil dump -publics "$pdb" | grep -q "S_PUB32 .*\`$2\`" || return 1
+  llvm-pdbutil dump -publics "$pdb" | grep "S_PUB32 .*\`$2\`" >/dev/null || return 1
   address=$(llvm-pdbutil dump -symbols "$pdb" | grep -A1 "S_GPROC32 .*\`$2\`" |
     sed -n 's/.*addr = \([0-9]*\):\([0-9]*\),.*/\1 \2/p')
   llvm-pdbutil dump -l "$pdb" | awk -v source="/usr/src/orvanesdk-$version/$3 " \
