@@ -17,15 +17,12 @@
 # names it without a folder. gdb (also under wine) keeps reading the .debug.
 #
 # Time stamps that a release writes (the PE header, which objcopy sets, and
-# the archive members) are ORVANE_SOURCE_DATE_EPOCH: SOURCE_DATE_EPOCH when
-# set, else the time of the commit built, so that two builds of one commit
-# give the same bytes.
+# the archive members) are ORVANE_SOURCE_DATE_EPOCH, SOURCE_DATE_EPOCH at
+# configure time: scripts/release.sh sets it to the commit's time, so that
+# two builds of one commit give the same bytes. It is fixed per configure, so
+# a build that only re-runs the split never strips a stripped binary again.
 add_library(orvane_debug_info INTERFACE)
 set(ORVANE_SOURCE_DATE_EPOCH $ENV{SOURCE_DATE_EPOCH})
-if(NOT ORVANE_SOURCE_DATE_EPOCH)
-  execute_process(COMMAND git -C ${PROJECT_SOURCE_DIR} log -1 --format=%ct
-    OUTPUT_VARIABLE ORVANE_SOURCE_DATE_EPOCH OUTPUT_STRIP_TRAILING_WHITESPACE ERROR_QUIET)
-endif()
 set(ORVANE_PDB OFF)
 set(ORVANE_SPLIT_DEBUG_INFO OFF)
 if(ORVANE_SEPARATE_DEBUG_INFO AND NOT MSVC AND CMAKE_BUILD_TYPE MATCHES "^(Release|RelWithDebInfo|MinSizeRel)$")
@@ -74,7 +71,7 @@ function(orvane_split_debug_info target)
     list(APPEND symbol_files ${pdb})
   endif()
   set(objcopy ${CMAKE_OBJCOPY})
-  if(ORVANE_SOURCE_DATE_EPOCH)
+  if(ORVANE_SOURCE_DATE_EPOCH AND WIN32)
     set(objcopy ${CMAKE_COMMAND} -E env SOURCE_DATE_EPOCH=${ORVANE_SOURCE_DATE_EPOCH} ${CMAKE_OBJCOPY})
   endif()
   add_custom_command(TARGET ${target} POST_BUILD
