@@ -21,7 +21,9 @@ if [ -z "${SOURCE_DATE_EPOCH:-}" ]; then
   SOURCE_DATE_EPOCH=$(git log -1 --format=%ct)
   export SOURCE_DATE_EPOCH
 fi
-rm -rf build/release
+# From nothing: an earlier build's objects would be reused, and a split
+# re-run on an already stripped binary leaves an empty .debug.
+rm -rf build/release build/release-linux build/release-windows
 for preset in release-linux release-windows; do
   printf '\n==== %s ====\n' "$preset"
   cmake --workflow --preset "$preset" --fresh
