@@ -77,5 +77,11 @@ if(PROJECT_IS_TOP_LEVEL)
   set(CPACK_ARCHIVE_SYMBOLS_FILE_NAME ${CPACK_PACKAGE_FILE_NAME}-symbols)
   set(CPACK_COMPONENT_INCLUDE_TOPLEVEL_DIRECTORY ON)
   set(CPACK_VERBATIM_VARIABLES ON)
+  # CPack takes every member's times from SOURCE_DATE_EPOCH when set: the
+  # release's (cmake/debug_info.cmake), so that a rebuild gives the same bytes.
+  if(ORVANE_SOURCE_DATE_EPOCH)
+    set(CPACK_PROJECT_CONFIG_FILE ${PROJECT_BINARY_DIR}/CPackReleaseTime.cmake)
+    file(WRITE ${CPACK_PROJECT_CONFIG_FILE} "set(ENV{SOURCE_DATE_EPOCH} ${ORVANE_SOURCE_DATE_EPOCH})\n")
+  endif()
   include(CPack)
 endif()

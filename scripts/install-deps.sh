@@ -9,12 +9,12 @@ set -euo pipefail
 # mono-mcs and mono-runtime compile and run the C# binding's tests; python3
 # is the strict JSON parser of the log reader's tests.
 packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind
-  mono-mcs mono-runtime python3)
+  mono-mcs mono-runtime python3 abigail-tools)
 if [ "${1:-all}" = all ]; then
   # wine answers the DLL's CNG calls with GnuTLS, a recommendation only; jq
   # runs in the README's log-reading recipe, which the package leg runs.
   packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30 llvm lld gdb jq
-    debootstrap)
+    debootstrap diffoscope-minimal)
 fi
 
 missing=()

@@ -2,14 +2,28 @@
 # Makes the release archives, all four in build/release/:
 #   OrvaneSDK-VERSION-linux-x86_64.tar.gz          the SDK for Linux
 #   OrvaneSDK-VERSION-linux-x86_64-symbols.tar.gz  its .debug files
-#   OrvaneSDK-VERSION-windows-x64.zip              the SDK for Windows (mingw-w64 DLL)
-#   OrvaneSDK-VERSION-windows-x64-symbols.zip      its .debug files
+#   OrvaneSDK-VERSION-windows-x64.zip              the SDK for Windows (clang + lld, mingw-w64 runtime)
+#   OrvaneSDK-VERSION-windows-x64-symbols.zip      its .debug files and PDBs
 # Each is a CMake workflow preset (configure, build, CPack); the builds are
 # build/release-linux and build/release-windows.
+#   scripts/release.sh          the archives
+#   scripts/release.sh twice    then the same sources again, in another folder
+#                               and later, and fails unless every archive is
+#                               the same bytes (diffoscope names what differs)
+# Two builds of one commit agree: time stamps are SOURCE_DATE_EPOCH, the
+# commit's time unless set; no path of the build folder is recorded; the
+# archives' members are sorted and their modes those of umask 022.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 scripts/install-deps.sh all
-rm -rf build/release
+umask 022
+if [ -z "${SOURCE_DATE_EPOCH:-}" ]; then
+  SOURCE_DATE_EPOCH=$(git log -1 --format=%ct)
+  export SOURCE_DATE_EPOCH
+fi
+# From nothing: an earlier build's objects would be reused, and a split
+# re-run on an already stripped binary leaves an empty .debug.
+rm -rf build/release build/release-linux build/release-windows
 for preset in release-linux release-windows; do
   printf '\n==== %s ====\n' "$preset"
   cmake --workflow --preset "$preset" --fresh
@@ -17,3 +31,23 @@ done
 rm -rf build/release/_CPack_Packages
 printf '\n'
 ls -l build/release
+[ "${1:-}" = twice ] || exit 0
+
+# The tracked files as they are now, in a second folder: the same commit.
+again=build/rebuild/OrvaneSDK
+rm -rf build/rebuild && mkdir -p "$again"
+git ls-files -z | xargs -0 tar -cf - | tar -xf - -C "$again"
+printf '\n==== the same release again, in %s ====\n' "$again"
+"$again/scripts/release.sh" >build/rebuild/release.log 2>&1 || { cat build/rebuild/release.log; exit 1; }
+status=0
+for archive in build/release/*; do
+  name=${archive#build/release/}
+  if ! cmp -s "$archive" "$again/build/release/$name"; then
+    echo "FAILED: $name differs between the two builds:"
+    diffoscope --no-progress --text - "$archive" "$again/build/release/$name" | head -60 || true
+    status=1
+  fi
+done
+[ "$(ls "$again/build/release")" = "$(ls build/release)" ] || { echo "FAILED: other archives"; status=1; }
+[ $status -eq 0 ] && echo "release: the second build gave the same bytes in every archive"
+exit $status

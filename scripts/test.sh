@@ -17,8 +17,8 @@ step() { printf '\n==== %s ====\n' "$*"; }
 if [ "$mode" = quick ]; then scripts/install-deps.sh linux; else scripts/install-deps.sh all; fi
 
 package_leg() {
-  step "Release archives (scripts/release.sh)"
-  scripts/release.sh
+  step "Release archives, built twice in two folders and compared (scripts/release.sh twice)"
+  scripts/release.sh twice
   step "Package: the README's adoption recipes against the archives (CMake, pkg-config, mingw, C#, MSVC ABI)"
   bash tests/package/consumers.sh build/release build/package
 }

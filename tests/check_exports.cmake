@@ -10,14 +10,28 @@ set(expected oAnalyticsGameEnter oAnalyticsGameExit oAnalyticsInit oAnalyticsSpe
 if(NOT found STREQUAL expected)
   message(FATAL_ERROR "exported symbols differ\n  expected: ${expected}\n  found:    ${found}")
 endif()
-execute_process(COMMAND nm ${LIBRARY} OUTPUT_VARIABLE symbols COMMAND_ERROR_IS_FATAL ANY)
+# A stripped library has its symbols in the .debug beside it.
+set(symbol_file ${LIBRARY})
+if(EXISTS ${LIBRARY}.debug)
+  set(symbol_file ${LIBRARY}.debug)
+endif()
+execute_process(COMMAND nm ${symbol_file} OUTPUT_VARIABLE symbols COMMAND_ERROR_IS_FATAL ANY)
+execute_process(COMMAND nm -D --undefined-only ${LIBRARY} OUTPUT_VARIABLE imports COMMAND_ERROR_IS_FATAL ANY)
+if(NOT symbols MATCHES " T oInitialize\n")
+  message(FATAL_ERROR "${symbol_file} has no symbol table to check")
+endif()
 string(REGEX MATCHALL "(_GLOBAL__sub_I_[^\n]*|__cxa_atexit|__cxa_thread_atexit[^\n]*)"
-  load_or_exit "${symbols}")
+  load_or_exit "${symbols}${imports}")
+# Whatever the symbols say, the loader runs one entry at load: the C
+# runtime's frame_dummy, and no .ctors.
+execute_process(COMMAND readelf -dSW ${LIBRARY} OUTPUT_VARIABLE dynamic COMMAND_ERROR_IS_FATAL ANY)
+if(NOT dynamic MATCHES "\\(INIT_ARRAYSZ\\) +8 \\(bytes\\)" OR dynamic MATCHES "\\.ctors")
+  list(APPEND load_or_exit "more than the C runtime's entry in .init_array or .ctors")
+endif()
 if(load_or_exit)
   message(FATAL_ERROR "the library runs code at load or at exit: ${load_or_exit}")
 endif()
 # dlclose must not unload it: each load and unload would leak what the load set up.
-execute_process(COMMAND readelf -d ${LIBRARY} OUTPUT_VARIABLE dynamic COMMAND_ERROR_IS_FATAL ANY)
 if(NOT dynamic MATCHES "FLAGS_1[^\n]*NODELETE")
   message(FATAL_ERROR "the library can be unloaded: it is not linked with -z nodelete")
 endif()

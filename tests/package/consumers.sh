@@ -28,6 +28,9 @@ wineboot -i </dev/null >/dev/null 2>&1 && wineserver -w # the prefix is made and
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
 wineserver -p </dev/null >/dev/null 2>&1
 for recipe in linux-cmake windows-cmake pkg-config csharp; do run $recipe bash -eu $recipe.sh; done
+for game in build-linux/game build-pc/game; do # the loader looks in the game's folder only
+  [ "$(readelf -d $game | sed -n 's/.*(RUNPATH).*\[\(.*\)\]/\1/p')" = '$ORIGIN' ] || fail "$game: RUNPATH"
+done
 mv "$linux" "$windows" ../away/
 rm -rf "$WINEPREFIX/drive_c/Orvane" && run games bash -eu run.sh
 mv ../away/* .
@@ -73,4 +76,22 @@ for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
     fail "gdb lists no sources of ours for $library"
   fi
 done
+# The PDB beside each Windows binary is the one its debug directory names (GUID, age, no folder), with
+# public symbols and a function of ours whose lines begin at its address, as a Windows debugger reads them.
+pdb_matches() { # BINARY FUNCTION SOURCE
+  local pdb=${1%.*}.pdb directory b address
+  directory=$(llvm-readobj --coff-debug-directory "$1")
+  read -ra b <<<"$(sed -n 's/.*PDBGUID: (\(.*\))/\1/p' <<<"$directory")"
+  local guid="${b[3]}${b[2]}${b[1]}${b[0]}-${b[5]}${b[4]}-${b[7]}${b[6]}-${b[8]}${b[9]}-$(printf %s "${b[@]:10}")"
+  [[ $directory == *"PDBAge: 1"*"PDBFileName: ${pdb##*/}"* ]] &&
+    [[ $(llvm-pdbutil dump -summary "$pdb") == *"Age: 1"*"GUID: {$guid}"* ]] || return 1
+  llvm-pdbutil dump -publics "$pdb" | grep "S_PUB32 .*\`$2\`" >/dev/null || return 1
+  address=$(llvm-pdbutil dump -symbols "$pdb" | grep -A1 "S_GPROC32 .*\`$2\`" |
+    sed -n 's/.*addr = \([0-9]*\):\([0-9]*\),.*/\1 \2/p')
+  llvm-pdbutil dump -l "$pdb" | awk -v source="/usr/src/orvanesdk-$version/$3 " \
+    -v start="$(printf '%04X:%08X-' $address)" 'index($0, source) == 1 { in_source = 1; next }
+    /^\// { in_source = 0 } in_source && index($0, "  " start) == 1 { found = 1 } END { exit !found }'
+}
+pdb_matches "$windows/bin/OrvaneSDK.dll" oAnalyticsGameEnter src/api/exports_analytics.cpp || fail "OrvaneSDK.pdb"
+pdb_matches "$windows/bin/orvane-logcat.exe" main tools/logcat/main.cpp || fail "orvane-logcat.pdb"
 echo "package: every recipe ran; the games recorded after the SDK folders were moved away"
