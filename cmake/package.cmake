@@ -12,12 +12,11 @@
 #   lib/pkgconfig/orvanesdk.pc                include/OrvaneSDK.h, OrvaneSDKVersion.h
 #   lib/cmake/OrvaneSDK/                      share/doc/OrvaneSDK/LICENSE, CHANGELOG.md, README.md
 #   include/OrvaneSDK.h, OrvaneSDKVersion.h   share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs
-#   LICENSE, CHANGELOG.md, README.md          share/OrvaneSDK/unity/com.orvane.sdk/
+#   LICENSE, CHANGELOG.md, README.md
 #   bindings/csharp/OrvaneSDK.cs
-#   unity/com.orvane.sdk/
-# The binding ships as its one source file and the Unity package as built
-# (bindings/csharp/CMakeLists.txt), with this platform's library in its
-# Plugins/x86_64/; the templates they are made from stay in the repository.
+# The binding ships as its one source file. The Unity package, with both
+# platforms' libraries, is a release output of its own, made from these
+# archives (scripts/unity-package.sh).
 include(CMakePackageConfigHelpers)
 set(cmake_dir ${CMAKE_INSTALL_LIBDIR}/cmake/OrvaneSDK)
 
@@ -55,7 +54,6 @@ else()
 endif()
 install(FILES LICENSE CHANGELOG.md README.md DESTINATION ${doc_dir} COMPONENT sdk)
 install(FILES bindings/csharp/OrvaneSDK.cs DESTINATION ${share_dir}/bindings/csharp COMPONENT sdk)
-install(DIRECTORY ${ORVANE_UNITY_PACKAGE} DESTINATION ${share_dir}/unity COMPONENT sdk)
 
 # Release archives: one with the sdk component, one with the symbols.
 if(PROJECT_IS_TOP_LEVEL)

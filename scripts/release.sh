@@ -1,20 +1,27 @@
 #!/usr/bin/env bash
-# Makes the release archives, all four in build/release/:
+# Makes the release archives, all four in build/release/, and the Unity package:
 #   OrvaneSDK-VERSION-linux-x86_64.tar.gz          the SDK for Linux
 #   OrvaneSDK-VERSION-linux-x86_64-symbols.tar.gz  its .debug files
 #   OrvaneSDK-VERSION-windows-x64.zip              the SDK for Windows (clang + lld, mingw-w64 runtime)
 #   OrvaneSDK-VERSION-windows-x64-symbols.zip      its .debug files and PDBs
-# Each is a CMake workflow preset (configure, build, CPack); the builds are
-# build/release-linux and build/release-windows.
+#   com.orvane.sdk-VERSION.tgz                     the Unity package, both libraries
+# Each archive is a CMake workflow preset (configure, build, CPack); the builds
+# are build/release-linux and build/release-windows. The Unity package is made
+# from the archives by scripts/unity-package.sh.
 #   scripts/release.sh          the archives
 #   scripts/release.sh twice    then the same sources again, in another folder
 #                               and later, and fails unless every archive is
 #                               the same bytes (diffoscope names what differs)
+#   scripts/release.sh --unity-folder DIR
+#                               DIR: the Unity package also as a folder, for a
+#                               release branch
 # Two builds of one commit agree: time stamps are SOURCE_DATE_EPOCH, the
 # commit's time unless set; no path of the build folder is recorded; the
 # archives' members are sorted and their modes those of umask 022.
 set -euo pipefail
 cd "$(dirname "$0")/.."
+unity_folder=""
+[ "${1:-}" = --unity-folder ] && unity_folder=$(realpath -m "$2")
 scripts/install-deps.sh all
 umask 022
 if [ -z "${SOURCE_DATE_EPOCH:-}" ]; then
@@ -29,6 +36,7 @@ for preset in release-linux release-windows; do
   cmake --workflow --preset "$preset" --fresh
 done
 rm -rf build/release/_CPack_Packages
+scripts/unity-package.sh build/release ${unity_folder:+"$unity_folder"}
 printf '\n'
 ls -l build/release
 [ "${1:-}" = twice ] || exit 0
