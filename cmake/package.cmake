@@ -14,6 +14,8 @@
 #   include/OrvaneSDK.h, OrvaneSDKVersion.h   share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs
 #   LICENSE, CHANGELOG.md, README.md          share/OrvaneSDK/unity/com.orvane.sdk/
 #   bindings/csharp/OrvaneSDK.cs
+#   bindings/python/, bindings/lua/         share/OrvaneSDK/bindings/python/, lua/
+#   examples/host.c                           share/OrvaneSDK/examples/host.c
 #   unity/com.orvane.sdk/
 # The binding ships as its one source file and the Unity package as built
 # (bindings/csharp/CMakeLists.txt), with this platform's library in its
@@ -56,6 +58,12 @@ endif()
 install(FILES LICENSE CHANGELOG.md README.md DESTINATION ${doc_dir} COMPONENT sdk)
 install(FILES bindings/csharp/OrvaneSDK.cs DESTINATION ${share_dir}/bindings/csharp COMPONENT sdk)
 install(DIRECTORY ${ORVANE_UNITY_PACKAGE} DESTINATION ${share_dir}/unity COMPONENT sdk)
+# The script bindings as their source (Python: a package folder for pip), and the run-time loading
+# example that docs/python.md and docs/lua.md point C hosts at.
+install(FILES bindings/python/pyproject.toml DESTINATION ${share_dir}/bindings/python COMPONENT sdk)
+install(FILES bindings/python/orvane/__init__.py DESTINATION ${share_dir}/bindings/python/orvane COMPONENT sdk)
+install(FILES bindings/lua/orvane.lua DESTINATION ${share_dir}/bindings/lua COMPONENT sdk)
+install(FILES examples/host.c DESTINATION ${share_dir}/examples COMPONENT sdk)
 
 # Release archives: one with the sdk component, one with the symbols.
 if(PROJECT_IS_TOP_LEVEL)
