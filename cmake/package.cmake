@@ -14,6 +14,8 @@
 #   include/OrvaneSDK.h, OrvaneSDKVersion.h   share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs
 #   LICENSE, CHANGELOG.md, README.md
 #   bindings/csharp/OrvaneSDK.cs
+#   bindings/python/, bindings/lua/         share/OrvaneSDK/bindings/python/, lua/
+#   examples/host.c                           share/OrvaneSDK/examples/host.c
 # The binding ships as its one source file. The Unity package, with both
 # platforms' libraries, is a release output of its own, made from these
 # archives (scripts/unity-package.sh).
@@ -54,6 +56,12 @@ else()
 endif()
 install(FILES LICENSE CHANGELOG.md README.md DESTINATION ${doc_dir} COMPONENT sdk)
 install(FILES bindings/csharp/OrvaneSDK.cs DESTINATION ${share_dir}/bindings/csharp COMPONENT sdk)
+# The script bindings as their source (Python: a package folder for pip), and the run-time loading
+# example that docs/python.md and docs/lua.md point C hosts at.
+install(FILES bindings/python/pyproject.toml DESTINATION ${share_dir}/bindings/python COMPONENT sdk)
+install(FILES bindings/python/orvane/__init__.py DESTINATION ${share_dir}/bindings/python/orvane COMPONENT sdk)
+install(FILES bindings/lua/orvane.lua DESTINATION ${share_dir}/bindings/lua COMPONENT sdk)
+install(FILES examples/host.c DESTINATION ${share_dir}/examples COMPONENT sdk)
 
 # Release archives: one with the sdk component, one with the symbols.
 if(PROJECT_IS_TOP_LEVEL)

@@ -54,23 +54,39 @@ extern "C" {
 
 /*
  * Level of a message: how the host should take it. Only these three occur.
- * C sees a 32-bit integer and prefixed constants; C++ sees a scoped enum of
- * the same size, so no bare name such as `Error` enters the host's scope.
+ * C sees a 32-bit integer and prefixed constants. C++ sees OrvaneLogLevel as
+ * an enumeration of the same size whose values are the same prefixed names,
+ * so `level == ORVANE_LOG_ERROR` and `case ORVANE_LOG_WARNING:` work as in C;
+ * from C++11 on it is a scoped enum (also OrvaneLogLevel::Info, ::Warning,
+ * ::Error), so no bare name such as `Error` enters the host's scope.
  */
+#if defined(__cplusplus) && (__cplusplus >= 201103L || (defined(_MSC_VER) && _MSC_VER >= 1700))
+enum class OrvaneLogLevel : int32_t { Info = 0, Warning = 1, Error = 2 };
+#define ORVANE_LOG_INFO (OrvaneLogLevel::Info)
+#define ORVANE_LOG_WARNING (OrvaneLogLevel::Warning)
+#define ORVANE_LOG_ERROR (OrvaneLogLevel::Error)
+#elif defined(__cplusplus)
+/* C++98 and C++03: a plain enum, an int on every C++ ABI, as the callback passes it. */
+enum OrvaneLogLevel { OrvaneLogLevel_Info = 0, OrvaneLogLevel_Warning = 1, OrvaneLogLevel_Error = 2 };
+#define ORVANE_LOG_INFO OrvaneLogLevel_Info
+#define ORVANE_LOG_WARNING OrvaneLogLevel_Warning
+#define ORVANE_LOG_ERROR OrvaneLogLevel_Error
+#else
+typedef int32_t OrvaneLogLevel;
 #define ORVANE_LOG_INFO 0    /* success and progress */
 #define ORVANE_LOG_WARNING 1 /* notice about the state of a game's log file */
 #define ORVANE_LOG_ERROR 2   /* refused input or a failure */
-
-#ifdef __cplusplus
-enum class OrvaneLogLevel : int32_t { Info = 0, Warning = 1, Error = 2 };
-#else
-typedef int32_t OrvaneLogLevel;
 #endif
 
 /*
  * The host's log callback, called on the thread of the library call that
- * caused the message. `message` begins with "[OrvaneSDK] ", carries no line
- * end, and is valid only during the call: copy it to keep it.
+ * caused the message: on several threads at once when several threads call
+ * the library. A host whose callbacks are bound to one thread (a LuaJIT
+ * ffi.cast callback, a script engine's main state) registers a callback
+ * written in C, calls the library only from that thread, or uses a binding
+ * that hands messages over to that thread (bindings/lua/orvane.lua).
+ * `message` begins with "[OrvaneSDK] ", carries no line end, and is valid
+ * only during the call: copy it to keep it.
  * The callback must return (no longjmp, no exception through C frames):
  * withdrawing it waits for its calls to end. C# hosts use
  * bindings/csharp/OrvaneSDK.cs, which keeps its delegate alive.

@@ -12,9 +12,10 @@ packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googl
   mono-mcs mono-runtime python3 abigail-tools)
 if [ "${1:-all}" = all ]; then
   # wine answers the DLL's CNG calls with GnuTLS, a recommendation only; jq
-  # runs in the README's log-reading recipe, which the package leg runs.
+  # runs in the README's log-reading recipe, which the package leg runs. love runs the LuaJIT binding's
+  # tests; python3-venv and python3-wheel install the Python binding in the docs' recipe.
   packages+=(clang libclang-rt-14-dev g++-mingw-w64-x86-64-posix wine wine64 libgnutls30 llvm lld gdb jq
-    debootstrap diffoscope-minimal)
+    debootstrap diffoscope-minimal love python3-venv python3-wheel)
 fi
 
 missing=()

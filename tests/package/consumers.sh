@@ -23,11 +23,11 @@ types() { "$linux/bin/orvane-logcat" "$1" | grep -o '"type":"[A-Z]*"' | tr -d '\
 
 awk '/^<!-- recipe: .* -->$/ { name = $3; system("mkdir -p $(dirname " name ")"); next }
      name && /^```/ { if (open) name = ""; open = !open; next }
-     open { print > name }' "$root/README.md"
+     open { print > name }' "$root/README.md" "$root"/docs/*.md
 wineboot -i </dev/null >/dev/null 2>&1 && wineserver -w # the prefix is made and written out first
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
 wineserver -p </dev/null >/dev/null 2>&1
-for recipe in linux-cmake windows-cmake pkg-config csharp; do run $recipe bash -eu $recipe.sh; done
+for recipe in linux-cmake windows-cmake pkg-config csharp python lua; do run $recipe bash -eu $recipe.sh; done
 for game in build-linux/game build-pc/game; do # the loader looks in the game's folder only
   [ "$(readelf -d $game | sed -n 's/.*(RUNPATH).*\[\(.*\)\]/\1/p')" = '$ORIGIN' ] || fail "$game: RUNPATH"
 done
