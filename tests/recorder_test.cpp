@@ -141,6 +141,15 @@ void NoLocks(bool (*append)(FileHandle, const void *, std::size_t)) {
   Live().try_lock_file = [](FileHandle, LockMode) { return LockResult::kFailed; };
   Live().append = append;
 }
+// A writer that the file system refuses locks records while this one, which
+// holds the exclusive lock, writes the log's first line.
+bool LocklessRecordsMeanwhile(FileHandle f, const void *d, std::size_t n) {
+  NoLocks(os.append);
+  oAnalyticsGameEnter("g1", "u1");
+  Live().open_log = os.open_log;
+  Live().try_lock_file = os.try_lock_file;
+  return os.append(f, d, n);
+}
 // Another writer holds the lock; time moves 100 ms per reading of the clock,
 // however short the pauses.
 int g_lock_tries;
@@ -218,6 +227,10 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
        0, {A(1, "INIT", "log had been already initialized.")}, {kTorn}, true},
       {"no locks: the log starts all the same; two writers finding it empty keep their lines apart", kNoLog,
        [] { NoLocks(AnotherRecordsMeanwhile); }, 0,
+       {kNeverInitialized, init_ok, ok, kNeverInitialized, init_ok, ok},
+       {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
+      {"locks refused to one writer only: its lines and the lock holder's stay apart", kNoLog,
+       [] { Live().append = LocklessRecordsMeanwhile; }, 0,
        {kNeverInitialized, init_ok, ok, kNeverInitialized, init_ok, ok},
        {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
       {"... a torn first line stays: cutting it may cut another's line", kNoLog, [] { NoLocks(ShortAppend); },
