@@ -240,6 +240,13 @@ Encoded EncodeLine(Workspace &space, const Event &event, std::string_view type, 
   const std::size_t least = kRecordFixedBytes + event.user_id.size() + event.game_id.size() + type.size() +
                             time.size() + extra.size();
   if (least > kMaxLineBytes / 2) return Encoded::kTooLarge;
+  // Escapes make a value at most six times its size: a record that could
+  // outgrow the line so has its escaped size counted first.
+  if (least > kMaxLineBytes / 12) {
+    std::size_t escaped = kRecordFixedBytes + type.size() + time.size();
+    for (const std::string_view value : {event.user_id, event.game_id, extra}) escaped += JsonEscapedSize(value);
+    if (2 * cipher::CiphertextSize(escaped) > kMaxLineBytes) return Encoded::kTooLarge;
+  }
   space.record.clear();
   AppendEventRecord(space.record, event.game_id, event.user_id, type, time, extra);
   if (2 * cipher::CiphertextSize(space.record.size()) > kMaxLineBytes) return Encoded::kTooLarge;
