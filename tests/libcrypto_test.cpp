@@ -26,7 +26,8 @@ TEST(LibCrypto, LoadsTheFirstThatExists) {
       {"a later name when the first is missing", kPresent, true},
   };
   for (const auto &r : rows) {
-    cipher::LibCrypto functions{};
+    static cipher::LibCrypto functions; // kept: the library context it makes lives as long as the process
+    functions = {};
     EXPECT_EQ(cipher::LoadLibCrypto(r.names, functions), r.loads) << r.row;
     if (r.loads) {
       EXPECT_TRUE(cipher::InitLibCrypto(functions) && functions.aes != nullptr) << r.row;
@@ -34,16 +35,14 @@ TEST(LibCrypto, LoadsTheFirstThatExists) {
   }
 }
 
-// The first and the last step of the initialisation failing, as memory
+// The first and a later step of the initialisation failing, as memory
 // exhaustion makes them: the half-made state is refused, never used.
 TEST(LibCrypto, AFailedInitialisationIsRefused) {
   for (const bool first : {true, false}) {
     cipher::LibCrypto functions{};
     ASSERT_TRUE(cipher::LoadLibCrypto(kPresent, functions));
     if (first) functions.init_crypto = [](std::uint64_t, const OPENSSL_INIT_SETTINGS *) { return 0; };
-    if (!first) functions.cipher_fetch = [](OSSL_LIB_CTX *, const char *, const char *) -> EVP_CIPHER * {
-      return nullptr;
-    };
+    if (!first) functions.lib_ctx_new = [] { return static_cast<OSSL_LIB_CTX *>(nullptr); };
     EXPECT_FALSE(cipher::InitLibCrypto(functions)) << first;
   }
 }
@@ -51,7 +50,7 @@ TEST(LibCrypto, AFailedInitialisationIsRefused) {
 // A load that failed (no descriptor free, say) is tried again by a later
 // call, at most once a second; a success is kept for good.
 TEST(LibCrypto, AFailedLoadIsTriedAgainAfterASecond) {
-  cipher::LibCryptoLoader loader;
+  static cipher::LibCryptoLoader loader;
   EXPECT_EQ(cipher::LoadLibCryptoOnce(loader, kAbsent, 5000), nullptr);
   EXPECT_EQ(cipher::LoadLibCryptoOnce(loader, kPresent, 5999), nullptr) << "not again within the second";
   const cipher::LibCrypto *loaded = cipher::LoadLibCryptoOnce(loader, kPresent, 6000);

@@ -19,6 +19,7 @@ bool LoadLibCrypto(std::span<const char *const> names, LibCrypto &f) {
   void *lib = platform::OpenSystemLibrary(names);
   if (lib == nullptr) return false;
   const bool version3 = Take(lib, "OSSL_LIB_CTX_new", f.lib_ctx_new) &&
+                        Take(lib, "OSSL_LIB_CTX_free", f.lib_ctx_free) &&
                         Take(lib, "OSSL_PROVIDER_load", f.provider_load) &&
                         Take(lib, "EVP_CIPHER_fetch", f.cipher_fetch);
   if (!version3) f.lib_ctx_new = nullptr;
@@ -41,14 +42,18 @@ bool InitLibCrypto(LibCrypto &f) {
     f.aes = f.aes_256_cbc();
     return f.aes != nullptr;
   }
-  // A context and provider that a failure leaves behind are not freed: a
-  // later attempt makes new ones, and failures are rare and bounded.
-  OSSL_LIB_CTX *context = f.lib_ctx_new();
-  f.aes = context != nullptr && f.provider_load(context, "default") != nullptr
-              ? f.cipher_fetch(context, "AES-256-CBC", nullptr)
+  // The context holds the provider and the cipher fetched from it; freeing
+  // it after a failure frees most of that (the provider's few hundred bytes
+  // stay, at most once a second).
+  f.context = f.lib_ctx_new();
+  f.aes = f.context != nullptr && f.provider_load(f.context, "default") != nullptr
+              ? f.cipher_fetch(f.context, "AES-256-CBC", nullptr)
               : nullptr;
-  if (f.aes == nullptr) f.clear_error();
-  return f.aes != nullptr;
+  if (f.aes != nullptr) return true;
+  f.lib_ctx_free(f.context);
+  f.context = nullptr;
+  f.clear_error();
+  return false;
 }
 
 const LibCrypto *LoadLibCryptoOnce(LibCryptoLoader &loader, std::span<const char *const> names,

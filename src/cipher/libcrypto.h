@@ -30,12 +30,15 @@ struct LibCrypto {
   decltype(&EVP_DecryptUpdate) decrypt_update;
   decltype(&EVP_DecryptFinal_ex) decrypt_final;
   decltype(&ERR_clear_error) clear_error;
-  // OpenSSL 3 only, all three or none: the library context of our own.
+  // OpenSSL 3 only, all four or none: the library context of our own.
   decltype(&OSSL_LIB_CTX_new) lib_ctx_new;
+  decltype(&OSSL_LIB_CTX_free) lib_ctx_free;
   decltype(&OSSL_PROVIDER_load) provider_load;
   decltype(&EVP_CIPHER_fetch) cipher_fetch;
-  // The cipher every context is made with, set by InitLibCrypto.
+  // The cipher every context is made with, and with OpenSSL 3 the context it
+  // comes from, set by InitLibCrypto.
   const EVP_CIPHER *aes;
+  OSSL_LIB_CTX *context;
 };
 
 // Loads the first of `names` that exists and takes every function from it.
