@@ -44,6 +44,7 @@ TEST(LogFormat, RecordTextWithEscapes) {
     EXPECT_EQ(out, R"(kept:{"user_id":")" + escaped +
                        R"(","game_id":"1234","type":"SPECIAL","time":"2024-05-17T08:30:00","extra":")" +
                        escaped + "\"}");
+    EXPECT_EQ(JsonEscapedSize(value), escaped.size()) << escaped;
   }
 }
 

@@ -10,12 +10,16 @@
 #include <new>
 
 static std::atomic<long> g_allocations{0}; // of this whole program, counted by the operator new below
+static std::atomic<std::size_t> g_largest{0}; // the largest since a test set it to 0
 
 void *operator new(std::size_t size) {
   ++g_allocations;
+  if (size > g_largest) g_largest = size;
   if (void *block = std::malloc(size != 0 ? size : 1)) return block;
   throw std::bad_alloc();
 }
+// GCC takes the malloc inside the operator new above for a mismatch of its own.
+#pragma GCC diagnostic ignored "-Wmismatched-new-delete"
 void operator delete(void *block) noexcept { std::free(block); }
 void operator delete(void *block, std::size_t) noexcept { std::free(block); }
 
@@ -141,6 +145,15 @@ void NoLocks(bool (*append)(FileHandle, const void *, std::size_t)) {
   Live().try_lock_file = [](FileHandle, LockMode) { return LockResult::kFailed; };
   Live().append = append;
 }
+// A writer that the file system refuses locks records while this one, which
+// holds the exclusive lock, writes the log's first line.
+bool LocklessRecordsMeanwhile(FileHandle f, const void *d, std::size_t n) {
+  NoLocks(os.append);
+  oAnalyticsGameEnter("g1", "u1");
+  Live().open_log = os.open_log;
+  Live().try_lock_file = os.try_lock_file;
+  return os.append(f, d, n);
+}
 // Another writer holds the lock; time moves 100 ms per reading of the clock,
 // however short the pauses.
 int g_lock_tries;
@@ -220,6 +233,10 @@ TEST_F(RecorderTest, FaultsAreReportedNeverOk) {
        [] { NoLocks(AnotherRecordsMeanwhile); }, 0,
        {kNeverInitialized, init_ok, ok, kNeverInitialized, init_ok, ok},
        {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
+      {"locks refused to one writer only: its lines and the lock holder's stay apart", kNoLog,
+       [] { Live().append = LocklessRecordsMeanwhile; }, 0,
+       {kNeverInitialized, init_ok, ok, kNeverInitialized, init_ok, ok},
+       {Rec("INIT"), Rec("ENTER"), Rec("INIT"), Rec("ENTER")}},
       {"... a torn first line stays: cutting it may cut another's line", kNoLog, [] { NoLocks(ShortAppend); },
        -1, {kNeverInitialized, init_write_failed, write_failed}, {kTorn}},
       {"locks that fail during the wait: the log starts all the same", kNoLog,
@@ -276,10 +293,14 @@ TEST_F(RecorderTest, RecordTooLargeIsRefusedBeforeAnythingIsWritten) {
   Captured().clear();
   EXPECT_EQ(oAnalyticsSpecial("g1", "u1", std::string(std::size_t{32} << 20, 'x').c_str()), -1);
   EXPECT_EQ(Log(), std::vector<std::string>{Rec("INIT")});
+  g_largest = 0; // 6 MiB of control bytes are 36 MiB once escaped
+  EXPECT_EQ(oAnalyticsSpecial("g1", "u1", std::string(std::size_t{6} << 20, '\x01').c_str()), -1);
+  EXPECT_LT(g_largest, std::size_t{7} << 20) << "refused before it was escaped";
   const std::size_t largest = (std::size_t{32} << 20) - 16 - 88; // 88: the rest of its record; 16: padding
   EXPECT_EQ(oAnalyticsSpecial("g1", "u1", std::string(largest, 'x').c_str()), 0);
   EXPECT_EQ(Captured(),
-            (std::vector<Message>{A(2, "SPECIAL", "failed. Record too large."), A(0, "SPECIAL", "OK")}));
+            (std::vector<Message>{A(2, "SPECIAL", "failed. Record too large."),
+                                  A(2, "SPECIAL", "failed. Record too large."), A(0, "SPECIAL", "OK")}));
 }
 
 } // namespace

@@ -240,6 +240,13 @@ Encoded EncodeLine(Workspace &space, const Event &event, std::string_view type, 
   const std::size_t least = kRecordFixedBytes + event.user_id.size() + event.game_id.size() + type.size() +
                             time.size() + extra.size();
   if (least > kMaxLineBytes / 2) return Encoded::kTooLarge;
+  // Escapes make a value at most six times its size: a record that could
+  // outgrow the line so has its escaped size counted first.
+  if (least > kMaxLineBytes / 12) {
+    std::size_t escaped = kRecordFixedBytes + type.size() + time.size();
+    for (const std::string_view value : {event.user_id, event.game_id, extra}) escaped += JsonEscapedSize(value);
+    if (2 * cipher::CiphertextSize(escaped) > kMaxLineBytes) return Encoded::kTooLarge;
+  }
   space.record.clear();
   AppendEventRecord(space.record, event.game_id, event.user_id, type, time, extra);
   if (2 * cipher::CiphertextSize(space.record.size()) > kMaxLineBytes) return Encoded::kTooLarge;
@@ -291,10 +298,17 @@ std::int32_t Record(MessageBatch &messages, Workspace &space, const Event &event
   // log ever starts with anything else. Where no lock keeps other writers
   // out, two may both find the log empty: each then puts a line break in
   // front, so that their lines cannot run together (readers skip the empty
-  // line).
+  // line). A file system may also refuse locks to one writer and grant them
+  // to another (a full lock table, a network share): a writer without a lock
+  // may then write between the measurement and the write of one that started
+  // the log under the exclusive lock, which puts no break in front. So a
+  // writer without a lock also ends its write with a line break: whatever
+  // comes after it starts on a line of its own.
   const bool starts_log = log.size == 0;
   const bool init_first = starts_log && !is_init;
   const bool break_first = starts_log && !log.exclusive;
+  const bool unlocked = log.lock != platform::LockResult::kLocked;
+  if (unlocked) space.line += platform::line_break();
   std::string_view bytes = space.line;
   if (init_first || break_first) {
     space.init_line = break_first ? platform::line_break() : std::string_view();

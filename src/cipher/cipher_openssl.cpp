@@ -27,7 +27,7 @@ EVP_CIPHER_CTX *NewContext(const LibCrypto &crypto, const std::uint8_t *key, con
                            int encrypt) {
   EVP_CIPHER_CTX *ctx = crypto.ctx_new();
   if (ctx == nullptr) return nullptr;
-  if (crypto.cipher_init(ctx, crypto.aes_256_cbc(), nullptr, key, iv, encrypt) != 1) {
+  if (crypto.cipher_init(ctx, crypto.aes, nullptr, key, iv, encrypt) != 1) {
     crypto.ctx_free(ctx);
     return nullptr;
   }

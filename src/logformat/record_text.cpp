@@ -87,6 +87,15 @@ void AppendJsonEscaped(std::string &out, std::string_view value) {
   out.append(value.data() + run, value.size() - run);
 }
 
+std::size_t JsonEscapedSize(std::string_view value) {
+  std::size_t size = value.size();
+  for (std::size_t i = FirstToEscape(value); i < value.size(); i += 1 + FirstToEscape(value.substr(i + 1))) {
+    const bool letter = kEscapedBytes.find(value[i]) != std::string_view::npos;
+    size += letter ? 1 : 5; // "\n" for one byte, or "\u00NN"
+  }
+  return size;
+}
+
 void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,
                        std::string_view type, std::string_view time, std::string_view extra) {
   const std::string_view values[] = {user_id, game_id, type, time, extra};

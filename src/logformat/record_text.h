@@ -21,6 +21,8 @@ inline constexpr std::string_view kEscapeLetters = "\"\\bfnrt/";
 // Appends `value` as the inside of a JSON string: `"` and `\` are escaped and
 // bytes below 0x20 take their JSON escape; every other byte stands as it came.
 void AppendJsonEscaped(std::string &out, std::string_view value);
+// The size that AppendJsonEscaped gives `value`, counted without building it.
+std::size_t JsonEscapedSize(std::string_view value);
 
 // Appends the record text of one event stamped with `time`.
 void AppendEventRecord(std::string &out, std::string_view game_id, std::string_view user_id,

@@ -89,12 +89,59 @@ std::int64_t FileSizeWindows(FileHandle file) {
   return size.QuadPart;
 }
 
+// Byte-range locks on Windows are mandatory: a write into a locked range
+// fails. The locks therefore cover bytes far beyond any real file size, where
+// no append ever lands; they only serve as tokens between handles.
+constexpr DWORD kLockOffsetHigh = 0x40000000; // byte 2^62: the log's lock
+constexpr DWORD kAppendLockOffset = 1;       // the byte after it: one append
+
+OVERLAPPED LockRange(DWORD offset = 0) {
+  OVERLAPPED where{};
+  where.Offset = offset;
+  where.OffsetHigh = kLockOffsetHigh;
+  return where;
+}
+
+// Windows appends through an append-only handle in one step. Wine (and so
+// Proton) seeks to the end and then writes, so two handles appending at once
+// may write over each other, across processes as within one: there every
+// append takes the append byte's lock first. Wine is known by the function
+// its ntdll exports under its name.
+bool AppendsNeedTheirLock() {
+  static const bool wine = [] {
+    const HMODULE ntdll = ::GetModuleHandleA("ntdll.dll");
+    return ntdll != nullptr && ::GetProcAddress(ntdll, "wine_get_version") != nullptr;
+  }();
+  return wine;
+}
+
+// Waits for the append byte, at most about a second: another writer holds it
+// for one write only. Locks of a handle that a process closes or loses when
+// it ends are given back by the system.
+bool LockForAppend(HANDLE file) {
+  const ULONGLONG deadline = ::GetTickCount64() + 1000;
+  for (int round = 0;; ++round) {
+    OVERLAPPED where = LockRange(kAppendLockOffset);
+    if (::LockFileEx(file, LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0, &where)) return true;
+    if (::GetLastError() != ERROR_LOCK_VIOLATION || ::GetTickCount64() >= deadline) return false;
+    ::Sleep(round < 50 ? 0 : 1);
+  }
+}
+
 bool AppendWindows(FileHandle file, const void *data, std::size_t size) {
   // One write call, as on POSIX: a short write is a failure, since retrying
   // would split the line.
   if (size > MAXDWORD) return false;
+  const bool serialised = AppendsNeedTheirLock();
+  if (serialised && !LockForAppend(AsHandle(file))) return false;
   DWORD written = 0;
-  return ::WriteFile(AsHandle(file), data, static_cast<DWORD>(size), &written, nullptr) && written == size;
+  const bool whole =
+      ::WriteFile(AsHandle(file), data, static_cast<DWORD>(size), &written, nullptr) && written == size;
+  if (serialised) {
+    OVERLAPPED where = LockRange(kAppendLockOffset);
+    ::UnlockFileEx(AsHandle(file), 0, 1, 0, &where);
+  }
+  return whole;
 }
 
 bool TruncateFileWindows(FileHandle file, std::int64_t size) {
@@ -108,18 +155,6 @@ bool TruncateFileWindows(FileHandle file, std::int64_t size) {
   const bool cut = ::SetFilePointerEx(writer, at, nullptr, FILE_BEGIN) && ::SetEndOfFile(writer);
   ::CloseHandle(writer);
   return cut;
-}
-
-// Byte-range locks on Windows are mandatory: a write into a locked range
-// fails. The lock therefore covers one byte far beyond any real file size,
-// where no append ever lands; it only serves as a token between processes.
-constexpr DWORD kLockOffsetHigh = 0x40000000; // byte 2^62
-
-OVERLAPPED LockRange() {
-  OVERLAPPED where{};
-  where.Offset = 0;
-  where.OffsetHigh = kLockOffsetHigh;
-  return where;
 }
 
 void UnlockFileWindows(FileHandle file) {
