@@ -68,6 +68,8 @@ rm -rf "$WINEPREFIX/drive_c/Orvane" && run d bash "$here/../windows/wine_run.sh"
 
 [ "$(stat -c %s "$windows/bin/OrvaneSDK.dll")" -lt 400000 ] || fail "OrvaneSDK.dll is not stripped"
 [ -z "$(find "$linux" "$windows" -name CMakeLists.txt -o -name '*.in')" ] || fail "build templates shipped"
+[ -e "$windows/docs/events.md" ] && [ -e "$linux/share/doc/OrvaneSDK/docs/events.md" ] &&
+  [ -z "$(find "$linux" "$windows" -name CONTRIBUTING.md)" ] || fail "the archives ship not the user pages alone"
 ! grep -rlaF "$root" "$linux" "$windows" || fail "these files name the folder the release was built in"
 for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
   gdb -batch -ex "set substitute-path /usr/src/orvanesdk-$version $root" -ex 'list oAnalyticsGameEnter' \
