@@ -55,6 +55,10 @@ else()
   set(share_dir ${CMAKE_INSTALL_DATADIR}/OrvaneSDK)
 endif()
 install(FILES LICENSE CHANGELOG.md README.md DESTINATION ${doc_dir} COMPONENT sdk)
+# The user pages beside the README, under docs/ as in the repository, so that its links hold; the
+# contributors' pages (CONTRIBUTING.md, src/README.md) stay in the repository.
+file(GLOB orvane_user_pages ${PROJECT_SOURCE_DIR}/docs/*.md)
+install(FILES ${orvane_user_pages} DESTINATION ${doc_dir}/docs COMPONENT sdk)
 install(FILES bindings/csharp/OrvaneSDK.cs DESTINATION ${share_dir}/bindings/csharp COMPONENT sdk)
 # The script bindings as their source (Python: a package folder for pip), and the run-time loading
 # example that docs/python.md and docs/lua.md point C hosts at.

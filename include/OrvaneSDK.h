@@ -26,6 +26,13 @@
  * Errors: no function throws, aborts or returns an error code other than the
  * ones documented here. Failures show as a result and an ORVANE_LOG_ERROR
  * message.
+ *
+ * These comments are the reference for each function, its messages and the
+ * game id rule. The pages beside the SDK's README link here and add what a
+ * reader needs besides: docs/events.md (when to send each event, running
+ * without a launcher), docs/troubleshooting.md (what to do about each
+ * message), docs/log-format.md (the exact bytes on disk, the key rule),
+ * docs/security.md (what the encryption protects, and what not).
  */
 #ifndef ORVANE_SDK_H
 #define ORVANE_SDK_H
@@ -34,6 +41,12 @@
 
 #include "OrvaneSDKVersion.h"
 
+/*
+ * On Windows the functions are imported from the DLL (dllimport). Define
+ * ORVANE_STATIC before including this header for declarations without the
+ * import attribute: a host that looks the functions up at run time, or one
+ * that builds the library's sources into itself (docs/integrating.md).
+ */
 #if defined(_WIN32)
 #define ORVANE_CALL __cdecl
 #if defined(ORVANE_BUILDING_LIBRARY)

@@ -7,8 +7,9 @@
 set -euo pipefail
 
 # mono-mcs and mono-runtime compile and run the C# binding's tests; python3
-# is the strict JSON parser of the log reader's tests.
-packages=(cmake ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind
+# is the strict JSON parser of the log reader's tests; make is the build program
+# that cmake picks when the docs' recipes name none.
+packages=(cmake make ninja-build g++ pkg-config libssl-dev openssl libgtest-dev googletest libbenchmark-dev valgrind
   mono-mcs mono-runtime python3 abigail-tools)
 if [ "${1:-all}" = all ]; then
   # wine answers the DLL's CNG calls with GnuTLS, a recommendation only; jq

@@ -18,7 +18,7 @@
 // No wrapper throws an exception of its own. Two can still escape any of
 // them, from the runtime's loader, on the first call that needs the library:
 //   DllNotFoundException        the native library was not found or did not
-//                               load (on Linux also when libssl3 is missing);
+//                               load (see docs/csharp.md);
 //   EntryPointNotFoundException the library lacks an export (one older than
 //                               this binding).
 // Where the library is looked for: mono and .NET first in the folder of the

@@ -1,7 +1,8 @@
 #!/bin/bash
-# The release archives as game teams take them, unpacked, and the README's adoption recipes run against
-# them exactly as written: each README block after a line `<!-- recipe: NAME -->` becomes the file NAME;
-# the *.sh ones run in the folder of the archives (CMake on Linux and cross-built for Windows with an
+# The release archives as game teams take them, unpacked, and the recipes of the README and docs/ run
+# against them exactly as written, in an environment as bare as a reader's (env -i: a PATH and a HOME,
+# no CMAKE_GENERATOR): each block after a line `<!-- recipe: NAME -->` becomes the file NAME; every
+# relative link and anchor of the docs must resolve (scripts/check-links.py); the *.sh ones run in the folder of the archives (CMake on Linux and cross-built for Windows with an
 # ordinary toolchain file, pkg-config, C# under mono); then the SDK folders are moved away and run.sh
 # starts every game (the Windows one under wine), read-logs.sh reads what they recorded. Beside the
 # recipes: an MSVC-ABI game (clang + lld-link, OrvaneSDK.lib) under wine, the Unity package of each
@@ -10,34 +11,38 @@
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd) root=$(cd "$(dirname "$0")/../.." && pwd)
 packages=$(cd "$1" && pwd) # WORK/wineprefix is kept between runs
-mkdir -p "$2" && cd "$2" && rm -rf run away && mkdir -p run/d away
-export WINEPREFIX=$PWD/wineprefix WINEDEBUG=-all XDG_DATA_HOME=$PWD/run/data CMAKE_GENERATOR=Ninja
+mkdir -p "$2" && cd "$2" && rm -rf run away home/.local/share/Orvane && mkdir -p run/d away home
+home=$PWD/home # home/.wine is kept between runs
+export WINEPREFIX=$home/.wine WINEDEBUG=-all
 cd run
 for archive in "$packages"/OrvaneSDK-*; do cmake -E tar xf "$archive"; done
 linux=$(echo "$PWD"/OrvaneSDK-*-linux-*) windows=$(echo "$PWD"/OrvaneSDK-*-windows-*)
 fail() { echo "FAILED: $*"; exit 1; }
 # run NAME COMMAND...: the output goes to NAME.log, shown when COMMAND fails.
 run() { "${@:2}" >>"$1.log" 2>&1 </dev/null || { cat "$1.log"; fail "${*:2}"; }; }
+# recipe NAME: the recipe NAME.sh as a reader runs it, with nothing of this script's environment.
+recipe() { run "$1" env -i PATH=/usr/local/bin:/usr/bin:/bin HOME="$home" LANG=C.UTF-8 WINEDEBUG=-all bash -eu "$1.sh"; }
 # types LOG: the types of LOG's records, read by the archive's orvane-logcat, as one word.
 types() { "$linux/bin/orvane-logcat" "$1" | grep -o '"type":"[A-Z]*"' | tr -d '\n'; }
 
 awk '/^<!-- recipe: .* -->$/ { name = $3; system("mkdir -p $(dirname " name ")"); next }
      name && /^```/ { if (open) name = ""; open = !open; next }
      open { print > name }' "$root/README.md" "$root"/docs/*.md
+python3 "$root/scripts/check-links.py" "$root" || fail "the docs hold links that lead nowhere"
 wineboot -i </dev/null >/dev/null 2>&1 && wineserver -w # the prefix is made and written out first
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
 wineserver -p </dev/null >/dev/null 2>&1
-for recipe in linux-cmake windows-cmake pkg-config csharp python lua; do run $recipe bash -eu $recipe.sh; done
+for name in linux-cmake windows-cmake pkg-config csharp python lua; do recipe $name; done
 for game in build-linux/game build-pc/game; do # the loader looks in the game's folder only
   [ "$(readelf -d $game | sed -n 's/.*(RUNPATH).*\[\(.*\)\]/\1/p')" = '$ORIGIN' ] || fail "$game: RUNPATH"
 done
 mv "$linux" "$windows" ../away/
-rm -rf "$WINEPREFIX/drive_c/Orvane" && run games bash -eu run.sh
+rm -rf "$WINEPREFIX/drive_c/Orvane" && recipe run
 mv ../away/* .
-run read-logs bash -eu read-logs.sh
+recipe read-logs && recipe decode-log
 session='"type":"INIT""type":"ENTER""type":"SPECIAL"' next='"type":"ENTER""type":"SPECIAL"'
-[ "$(types data/Orvane/Logs/space-race.log)" = "$session$next$next" ] ||
-  fail "the Linux games' log holds $(types data/Orvane/Logs/space-race.log)"
+[ "$(types "$home/.local/share/Orvane/Logs/space-race.log")" = "$session$next$next" ] ||
+  fail "the Linux games' log holds $(types "$home/.local/share/Orvane/Logs/space-race.log")"
 [ "$(types "$WINEPREFIX/drive_c/Orvane/Logs/space-race.log")" = "$session" ] || fail "the Windows game's log"
 [ "$(grep -c ' 3f6c2a9e-41d7-4b8e-9a0c-5d1e7f2b8c44 level=3$' read-logs.log)" = 3 ] || fail "read-logs.sh"
 grep -o 'OrvaneSDK-[^ ]*' msvc.bat | while read -r path; do
@@ -66,6 +71,8 @@ rm -rf "$WINEPREFIX/drive_c/Orvane" && run d bash "$here/../windows/wine_run.sh"
 
 [ "$(stat -c %s "$windows/bin/OrvaneSDK.dll")" -lt 400000 ] || fail "OrvaneSDK.dll is not stripped"
 [ -z "$(find "$linux" "$windows" -name CMakeLists.txt -o -name '*.in')" ] || fail "build templates shipped"
+[ -e "$windows/docs/events.md" ] && [ -e "$linux/share/doc/OrvaneSDK/docs/events.md" ] &&
+  [ -z "$(find "$linux" "$windows" -name CONTRIBUTING.md)" ] || fail "the archives ship not the user pages alone"
 ! grep -rlaF "$root" "$linux" "$windows" || fail "these files name the folder the release was built in"
 for library in "$linux/lib/libOrvaneSDK.so" "$windows/bin/OrvaneSDK.dll"; do
   gdb -batch -ex "set substitute-path /usr/src/orvanesdk-$version $root" -ex 'list oAnalyticsGameEnter' \
