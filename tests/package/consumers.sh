@@ -49,15 +49,6 @@ grep -o 'OrvaneSDK-[^ ]*' msvc.bat | while read -r path; do
   [ -e "${path//\\//}" ] || fail "msvc.bat: no $path"
 done
 version=$(PKG_CONFIG_PATH=$linux/lib/pkgconfig pkg-config --modversion orvanesdk)
-while read -r manifest; do # the archive's own binding and library, in the package it names
-  case $manifest in
-  *windows*) binding=$windows/bindings/csharp/OrvaneSDK.cs library=$windows/bin/OrvaneSDK.dll ;;
-  *) binding=$linux/share/OrvaneSDK/bindings/csharp/OrvaneSDK.cs \
-    library=$linux/lib/libOrvaneSDK.so.$version ;;
-  esac
-  run unity cmake -DPACKAGE="$PWD/$(dirname "$manifest")" -DBINDING="$binding" -DLIBRARY="$library" \
-    -DVERSION="$version" -P "$here/../check_unity_package.cmake"
-done <unity-packages.txt
 
 # kernel32 and msvcrt come from mingw-w64's import libraries, which lld-link reads too.
 run d clang --target=x86_64-pc-windows-msvc -ffreestanding -Wall -Wextra -Wpedantic -Werror \
