@@ -21,7 +21,7 @@ fail() { echo "FAILED: $*"; exit 1; }
 # run NAME COMMAND...: the output goes to NAME.log, shown when COMMAND fails.
 run() { "${@:2}" >>"$1.log" 2>&1 </dev/null || { cat "$1.log"; fail "${*:2}"; }; }
 # recipe NAME: the recipe NAME.sh as a reader runs it, with nothing of this script's environment.
-recipe() { run "$1" env -i PATH=/usr/local/bin:/usr/bin:/bin HOME="$home" LANG=C.UTF-8 WINEDEBUG=-all bash -eu "$1.sh"; }
+recipe() { run "$1" env -i PATH=/usr/local/bin:/usr/bin:/bin HOME="$home" LANG=C.UTF-8 bash -eu "$1.sh"; }
 # types LOG: the types of LOG's records, read by the archive's orvane-logcat, as one word.
 types() { "$linux/bin/orvane-logcat" "$1" | grep -o '"type":"[A-Z]*"' | tr -d '\n'; }
 
